@@ -1,0 +1,24 @@
+#pragma once
+
+// The platform pieces of the core library. Each function has one definition in
+// b_platform_posix.cpp and one in b_platform_win.cpp; nothing else calls the system.
+
+#include "b_containers.h"
+
+#include <cstdint>
+
+namespace base::platform {
+
+/// Text of the calling thread's stack without its innermost `skip` frames, a frame a line.
+base::string captureStack(int skip);
+
+/// The system's text for an error code as the system gives it; empty for an unknown code.
+base::string systemErrorText(std::uint32_t code);
+
+/// Lets another thread run.
+void yieldThread();
+
+/// Sleeps the calling thread; 0 gives up the rest of its time slice.
+void sleepMilliseconds(unsigned milliseconds);
+
+}  // namespace base::platform

@@ -1,0 +1,41 @@
+#include "b_platform.h"
+
+#include <execinfo.h>
+#include <sched.h>
+
+#include <cstdlib>
+#include <cstring>
+#include <memory>
+#include <thread>
+
+namespace base::platform {
+
+base::string systemErrorText(std::uint32_t code) {
+  // glibc names every code it knows; for the others strerror would invent "Unknown error N".
+  const int value = static_cast<int>(code);
+  if (code > 0x7fffffffu || strerrorname_np(value) == nullptr) return {};
+  char buffer[1024];
+  const char* text = strerror_r(value, buffer, sizeof buffer);
+  return base::string(text);
+}
+
+base::string captureStack(int skip) {
+  constexpr int maxFrames = 64;
+  void* frames[maxFrames];
+  const int count = backtrace(frames, maxFrames);
+  std::unique_ptr<char*, decltype(&std::free)> symbols(backtrace_symbols(frames, count), &std::free);
+  base::string text;
+  for (int i = skip + 1; i < count; ++i) {
+    text += symbols ? symbols.get()[i] : "?";
+    text += '\n';
+  }
+  return text;
+}
+
+void yieldThread() { sched_yield(); }
+
+void sleepMilliseconds(unsigned milliseconds) {
+  std::this_thread::sleep_for(std::chrono::milliseconds(milliseconds));
+}
+
+}  // namespace base::platform

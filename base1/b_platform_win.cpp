@@ -1,0 +1,44 @@
+#include "b_platform.h"
+
+#include <windows.h>
+
+#include <cstdio>
+
+namespace base::platform {
+
+base::string systemErrorText(std::uint32_t code) {
+  wchar_t wide[1024];
+  const DWORD length = FormatMessageW(FORMAT_MESSAGE_FROM_SYSTEM | FORMAT_MESSAGE_IGNORE_INSERTS, nullptr, code,
+                                      MAKELANGID(LANG_NEUTRAL, SUBLANG_DEFAULT), wide, 1024, nullptr);
+  if (length == 0) return {};
+  const int bytes = WideCharToMultiByte(CP_UTF8, 0, wide, static_cast<int>(length), nullptr, 0, nullptr, nullptr);
+  base::string result(static_cast<std::size_t>(bytes), '\0');
+  WideCharToMultiByte(CP_UTF8, 0, wide, static_cast<int>(length), result.data(), bytes, nullptr, nullptr);
+  return result;
+}
+
+base::string captureStack(int skip) {
+  constexpr int maxFrames = 62;
+  void* frames[maxFrames];
+  const USHORT count = CaptureStackBackTrace(static_cast<DWORD>(skip + 1), maxFrames, frames, nullptr);
+  base::string text;
+  for (USHORT i = 0; i < count; ++i) {
+    HMODULE module = nullptr;
+    char name[MAX_PATH] = "?";
+    if (GetModuleHandleExA(GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT,
+                           static_cast<LPCSTR>(frames[i]), &module)) {
+      GetModuleFileNameA(module, name, MAX_PATH);
+    }
+    char line[MAX_PATH + 64];
+    std::snprintf(line, sizeof line, "%s(+0x%llx)\n", name,
+                  static_cast<unsigned long long>(static_cast<char*>(frames[i]) - reinterpret_cast<char*>(module)));
+    text += line;
+  }
+  return text;
+}
+
+void yieldThread() { SwitchToThread(); }
+
+void sleepMilliseconds(unsigned milliseconds) { Sleep(milliseconds); }
+
+}  // namespace base::platform

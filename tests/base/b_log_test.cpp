@@ -1,0 +1,89 @@
+#include "b_log.h"
+#include "log_capture.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdio>
+#include <fstream>
+#include <sstream>
+
+namespace {
+
+using testing_support::LogCapture;
+
+// Counts how often it is formatted, to prove that filtered messages are never formatted.
+struct Counted {
+  int* formatted;
+};
+
+}  // namespace
+
+template <>
+struct fmt::formatter<Counted> : fmt::formatter<int> {
+  auto format(const Counted& value, fmt::format_context& context) const {
+    ++*value.formatted;
+    return fmt::formatter<int>::format(*value.formatted, context);
+  }
+};
+
+namespace {
+
+TEST(Log, MessagesAboveTheLevelAreDroppedBeforeFormatting) {
+  LogCapture capture(base::logWarning);
+  int formatted = 0;
+  base::log().message(base::logScene, base::logInfo, "value {}", Counted{&formatted});
+  base::log().message(base::logScene, base::logDebug, "value {}", Counted{&formatted});
+  EXPECT_EQ(formatted, 0);
+  EXPECT_TRUE(capture.entries.empty());
+
+  base::log().message(base::logScene, base::logWarning, "value {}", Counted{&formatted});
+  base::log().message(base::logScene, base::logError, "value {}", Counted{&formatted});
+  EXPECT_EQ(formatted, 2);
+  ASSERT_EQ(capture.entries.size(), 2u);
+  EXPECT_EQ(capture.entries[0].level, base::logWarning);
+  EXPECT_EQ(capture.entries[0].category, base::logScene);
+}
+
+TEST(Log, EmptyFormatIsDropped) {
+  LogCapture capture;
+  base::log().message(base::logIO, base::logError, "");
+  base::log().text(base::logIO, base::logError, "");
+  EXPECT_TRUE(capture.entries.empty());
+}
+
+TEST(Log, PlaceholdersAreFilledInTurnAndHexWorks) {
+  LogCapture capture;
+  base::log().message(base::logSystem, base::logError, "plugin {} of {} at {:x}", 3, "mesh", 255u);
+  base::log().message(base::logSystem, base::logError, "no arguments: {} stays");
+  EXPECT_EQ(capture.texts(), (std::vector<std::string>{"plugin 3 of mesh at ff", "no arguments: {} stays"}));
+}
+
+TEST(Log, CategoriesAreTheInternedNames) {
+  EXPECT_EQ(base::logScene, base::intern("scene"));
+  EXPECT_EQ(base::logSystem, base::intern("system"));
+  EXPECT_EQ(base::logIO, base::intern("io"));
+  EXPECT_EQ(base::logAll, base::intern("all"));
+}
+
+TEST(Log, FileSinkAppendsLevelCategoryAndText) {
+  const std::string path = ::testing::TempDir() + "meshport_log_test.txt";
+  std::remove(path.c_str());
+  std::string error;
+  LogCapture capture;
+  ASSERT_TRUE(base::log().setFile(path, error)) << error;
+  base::log().message(base::logIO, base::logWarning, "stream '{}' is short", "a.ply");
+  ASSERT_TRUE(base::log().setFile("", error));
+
+  std::ifstream file(path);
+  std::stringstream content;
+  content << file.rdbuf();
+  EXPECT_NE(content.str().find("warning [io] stream 'a.ply' is short\n"), std::string::npos) << content.str();
+}
+
+TEST(Log, FileSinkThatCannotOpenSaysWhy) {
+  std::string error;
+  EXPECT_FALSE(base::log().setFile("/nonexistent-dir/x/log.txt", error));
+  EXPECT_EQ(error, "No such file or directory");
+}
+
+}  // namespace
