@@ -1,0 +1,7 @@
+#include "b_hash.h"
+
+namespace base {
+
+Hash::~Hash() = default;
+
+}  // namespace base

@@ -1,0 +1,192 @@
+#include "b_exception.h"
+#include "b_stream.h"
+#include "test_streams.h"
+
+#include <gtest/gtest.h>
+
+#include <string>
+
+namespace {
+
+using testing_support::FileLikeWorker;
+using testing_support::fileLikeStream;
+using testing_support::readAll;
+
+std::string pattern(std::size_t size) {
+  std::string data(size, '\0');
+  for (std::size_t i = 0; i < size; ++i) data[i] = static_cast<char>('a' + (i * 7) % 26);
+  return data;
+}
+
+TEST(BufReadStream, InMemorySourceIsReturnedAsItIs) {
+  base::Stream memory = base::memStream("abc", 3);
+  EXPECT_EQ(base::bufReadStream(memory, 0, 64).worker(), memory.worker());
+}
+
+TEST(BufReadStream, CapabilitiesFollowTheSource) {
+  EXPECT_EQ(base::bufReadStream(fileLikeStream("x"), 0, 64).worker()->capabilities(), 261u + 8u);
+  EXPECT_EQ(base::bufReadStream(fileLikeStream("x", base::capRead), 0, 64).worker()->capabilities(), 261u);
+  EXPECT_EQ(base::bufWriteStream(base::memStream(0), 64).worker()->capabilities(), 266u);
+  EXPECT_EQ(base::bufWriteStream(fileLikeStream("", base::capWrite), 64).worker()->capabilities(), 258u);
+}
+
+TEST(BufReadStream, ReadsAcrossRefillsWithFewSourceCalls) {
+  const std::string data = pattern(1000);
+  auto* worker = new FileLikeWorker(data);
+  base::Stream source = base::Stream::adopt(worker);
+  base::Stream buffered = base::bufReadStream(source, 0, 128);
+  std::string got;
+  char piece[37];
+  for (std::uint32_t n; (n = buffered.read(piece, sizeof piece)) > 0;) got.append(piece, n);
+  EXPECT_EQ(got, data);
+  // 1000 bytes through refills of 64 new bytes each after the first (history is kept).
+  EXPECT_LE(worker->reads, 17);
+  EXPECT_TRUE(buffered.isEOF());
+}
+
+TEST(BufReadStream, HistoryAllowsShortBackwardMovesAfterARefill) {
+  const std::string data = pattern(300);
+  auto* worker = new FileLikeWorker(data);
+  base::Stream buffered = base::bufReadStream(base::Stream::adopt(worker), 0, 128);
+  char buffer[130];
+  ASSERT_EQ(buffered.read(buffer, 100), 100u);
+  ASSERT_EQ(buffered.read(buffer, 50), 50u);  // crosses the buffer's edge: a refill
+  const int readsBefore = worker->reads;
+  EXPECT_EQ(buffered.setPosition(-60, base::seekCurrent), 90);
+  ASSERT_EQ(buffered.read(buffer, 60), 60u);
+  EXPECT_EQ(std::string(buffer, 60), data.substr(90, 60));
+  EXPECT_EQ(worker->reads, readsBefore);
+}
+
+TEST(BufReadStream, LargeReadsBypassTheBufferAndKeepHistory) {
+  const std::string data = pattern(5000);
+  auto* worker = new FileLikeWorker(data);
+  base::Stream buffered = base::bufReadStream(base::Stream::adopt(worker), 0, 256);
+  std::string big(4000, '\0');
+  ASSERT_EQ(buffered.read(big.data(), 4000), 4000u);
+  EXPECT_EQ(big, data.substr(0, 4000));
+  const int readsBefore = worker->reads;
+  buffered.setPosition(-10, base::seekCurrent);
+  char tail[10];
+  ASSERT_EQ(buffered.read(tail, 10), 10u);
+  EXPECT_EQ(std::string(tail, 10), data.substr(3990, 10));
+  EXPECT_EQ(worker->reads, readsBefore);
+}
+
+TEST(BufReadStream, PositionsCountFromTheSourcePositionAndFarSeeksMoveIt) {
+  const std::string data = pattern(1000);
+  base::Stream source = fileLikeStream(data);
+  source.setPosition(100);
+  base::Stream buffered = base::bufReadStream(source, 0, 64);
+  EXPECT_EQ(buffered.getPosition(), 0);
+  EXPECT_EQ(buffered.getSize(), 900);
+  EXPECT_EQ(buffered.setPosition(-10, base::seekEnd), 890);
+  char buffer[20];
+  EXPECT_EQ(buffered.read(buffer, 20), 10u);
+  EXPECT_EQ(std::string(buffer, 10), data.substr(990));
+  EXPECT_EQ(buffered.setPosition(5000), 900);
+}
+
+TEST(BufReadStream, LengthLimitsTheView) {
+  base::Stream buffered = base::bufReadStream(fileLikeStream("0123456789"), 4, 64);
+  EXPECT_EQ(buffered.getSize(), 4);
+  EXPECT_EQ(readAll(buffered), "0123");
+}
+
+TEST(BufReadStream, BadOriginsThrow) {
+  base::Stream buffered = base::bufReadStream(fileLikeStream("abc"), 0, 64);
+  EXPECT_THROW(buffered.setPosition(0, 3), base::switch_exception);
+  base::Stream unsized = base::bufReadStream(fileLikeStream("abc", base::capRead | base::capPosition), 0, 64);
+  try {
+    unsized.setPosition(0, base::seekEnd);
+    FAIL();
+  } catch (const base::unsupported_interface& error) {
+    EXPECT_STREQ(error.interfaceName(), "Stream::getSize");
+    EXPECT_STREQ(error.function(), "base::bufSetPosition");
+  }
+}
+
+TEST(BufReadStream, SourceDoesNotThrowInsideTheBufferAndComesBackWithItsFlags) {
+  base::Stream source = fileLikeStream("abc");
+  source.flags = base::throwOnShortRead;
+  source.tag = 0x100000000;
+  base::Stream buffered = base::bufReadStream(source, 0, 64);
+  EXPECT_EQ(buffered.tag, 0x100000000u);
+  char buffer[10];
+  EXPECT_EQ(buffered.read(buffer, 10), 3u);
+  base::Stream back = buffered.worker()->getSource();
+  EXPECT_EQ(back.flags, base::throwOnShortRead);
+  EXPECT_EQ(back.tag, 0x100000000u);
+}
+
+TEST(BufReadStream, ReleaseLeavesTheSourceWhereReadingStopped) {
+  base::Stream source = fileLikeStream(pattern(1000));
+  {
+    base::Stream buffered = base::bufReadStream(source, 0, 256);
+    char buffer[10];
+    buffered.read(buffer, 10);
+  }
+  EXPECT_EQ(source.getPosition(), 10);
+}
+
+TEST(CharStream, OneBytePerReadAndPushbackAtABufferEdge) {
+  const std::string data = pattern(200);
+  base::Stream chars = base::charStream(fileLikeStream(data), 64);
+  char byte = 0;
+  char many[8];
+  std::string got;
+  for (int i = 0; i < 64; ++i) {
+    ASSERT_EQ(chars.read(many, 8), 1u);
+    got += many[0];
+  }
+  // The buffer is exhausted: the next read refills, then one byte goes back over the edge.
+  ASSERT_EQ(chars.read(&byte, 1), 1u);
+  EXPECT_EQ(byte, data[64]);
+  EXPECT_EQ(chars.setPosition(-1, base::seekCurrent), 64);
+  ASSERT_EQ(chars.read(&byte, 1), 1u);
+  EXPECT_EQ(byte, data[64]);
+  while (chars.read(&byte, 1) == 1) got += byte;
+  EXPECT_EQ(got.size(), 199u);
+  EXPECT_EQ(chars.read(&byte, 1), 0u);
+}
+
+struct Limited : FileLikeWorker {
+  Limited(std::uint32_t room) : FileLikeWorker("", base::capWrite | base::capSize), room(room) {}
+  std::uint32_t write(const void* data, std::uint32_t count) override {
+    const std::uint32_t n = std::min(count, room - static_cast<std::uint32_t>(written.size()));
+    written.append(static_cast<const char*>(data), n);
+    return n;
+  }
+  std::int64_t getSize() override { return static_cast<std::int64_t>(written.size()); }
+  std::uint32_t room;
+  std::string written;
+};
+
+TEST(BufWriteStream, CollectsWritesAndFlushesOnClose) {
+  base::Stream target = base::memStream(0);
+  {
+    base::Stream buffered = base::bufWriteStream(target, 16);
+    buffered.write("0123456789", 10);
+    EXPECT_EQ(target.getSize(), 0);
+    buffered.write("abcdefghij", 10);  // fills the buffer, writes it, then the rest directly
+    EXPECT_EQ(target.getSize(), 20);
+    buffered.write("tail", 4);
+    EXPECT_EQ(target.getSize(), 20);
+  }
+  target.setPosition(0);
+  EXPECT_EQ(readAll(target), "0123456789abcdefghijtail");
+}
+
+TEST(BufWriteStream, ShortWriteThrowsWhenTheDestinationAskedForIt) {
+  base::Stream destination = base::Stream::adopt(new Limited(5));
+  destination.flags = base::throwOnShortWrite;
+  base::Stream buffered = base::bufWriteStream(destination, 4, "out");
+  try {
+    buffered.write("0123456789", 10);
+    FAIL();
+  } catch (const base::exception& error) {
+    EXPECT_STREQ(error.what(), "stream 'file-like': trying to write 6 bytes, written 1 bytes");
+  }
+}
+
+}  // namespace

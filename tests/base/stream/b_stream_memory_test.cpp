@@ -1,0 +1,136 @@
+#include "b_exception.h"
+#include "b_stream.h"
+#include "test_streams.h"
+
+#include <gtest/gtest.h>
+
+namespace {
+
+using testing_support::fileLikeStream;
+using testing_support::readAll;
+
+TEST(MemStream, CapabilityWords) {
+  EXPECT_EQ(base::memStream(4).worker()->capabilities(), 127u);
+  EXPECT_EQ(base::memStream("ab", 2, "view").worker()->capabilities(), 109u);
+  EXPECT_EQ(base::memBlockStream().worker()->capabilities(), 31u);
+  base::vector<std::uint8_t> bytes;
+  const base::vector<std::uint8_t>& constBytes = bytes;
+  base::string text;
+  const base::string& constText = text;
+  EXPECT_EQ(base::vectorStream(bytes).worker()->capabilities(), 31u);
+  EXPECT_EQ(base::vectorStream(constBytes).worker()->capabilities(), 13u);
+  EXPECT_EQ(base::stringStream(text).worker()->capabilities(), 31u);
+  EXPECT_EQ(base::stringStream(constText).worker()->capabilities(), 13u);
+}
+
+TEST(MemStream, PositionsClampIntoTheBlock) {
+  base::Stream stream = base::memStream("abcd", 4);
+  EXPECT_EQ(stream.setPosition(-5, base::seekBegin), 0);
+  EXPECT_EQ(stream.setPosition(5, base::seekEnd), 4);
+  EXPECT_EQ(stream.setPosition(-1, base::seekCurrent), 3);
+  EXPECT_EQ(stream.setPosition(1, /*origin=*/7), 3);
+  EXPECT_FALSE(stream.isEOF());
+}
+
+TEST(MemStream, WritesPastTheEndGrowTheBlockAndDropNothing) {
+  base::Stream stream = base::memStream("abcd", 4);
+  stream.setPosition(2);
+  EXPECT_EQ(stream.write("XYZ", 3), 3u);
+  EXPECT_EQ(stream.getSize(), 5);
+  stream.setPosition(0, base::seekEnd);
+  stream.write("123", 3);
+  EXPECT_EQ(stream.getSize(), 8);
+  stream.setPosition(0);
+  EXPECT_EQ(readAll(stream), "abXYZ123");
+}
+
+TEST(MemStream, SetSizeAndCloseAndEmptyBlocks) {
+  base::Stream stream = base::memStream("abcdef", 6);
+  stream.setPosition(5);
+  stream.worker()->setSize(2);
+  EXPECT_EQ(stream.getPosition(), 2);
+  EXPECT_EQ(stream.getSize(), 2);
+  stream.worker()->close();
+  EXPECT_EQ(stream.worker()->capabilities(), 0u);
+  EXPECT_EQ(stream.getSize(), 0);
+
+  base::Stream none = base::memStream(-3);
+  EXPECT_EQ(none.getSize(), 0);
+  EXPECT_TRUE(none.isEOF());
+}
+
+TEST(MemStream, ViewReadsExternalMemoryWithoutCopying) {
+  const char data[] = "view me";
+  base::Stream view = base::memStream(data, 7, "view");
+  std::int64_t offset = -1, size = -1;
+  EXPECT_EQ(view.worker()->getMemory(&offset, &size), reinterpret_cast<const std::uint8_t*>(data));
+  EXPECT_EQ(offset, 0);
+  EXPECT_EQ(size, 7);
+  view.worker()->setSize(1);
+  EXPECT_EQ(view.getSize(), 7);
+  EXPECT_EQ(readAll(view), "view me");
+}
+
+TEST(MemStream, FromASourceTakesWhatIsLeft) {
+  base::Stream source = fileLikeStream("0123456789");
+  source.setPosition(3);
+  base::Stream copy = base::memStream(source);
+  EXPECT_EQ(readAll(copy), "3456789");
+
+  base::Stream unsized = fileLikeStream("stream without a size", base::capRead);
+  base::Stream whole = base::memStream(unsized);
+  EXPECT_EQ(readAll(whole), "stream without a size");
+}
+
+TEST(MemBlockStream, EachWriteAppendsAndReadsCrossBlocks) {
+  base::Stream stream = base::memBlockStream();
+  stream.write("ab", 2);
+  stream.write("cde", 3);
+  stream.write("f", 1);
+  EXPECT_EQ(stream.getSize(), 6);
+  EXPECT_EQ(stream.getPosition(), 6);
+  EXPECT_EQ(stream.setPosition(1), 1);
+  char buffer[8] = {};
+  EXPECT_EQ(stream.read(buffer, 4), 4u);
+  EXPECT_EQ(std::string(buffer, 4), "bcde");
+  EXPECT_EQ(stream.setPosition(-10, base::seekCurrent), 0);
+  EXPECT_EQ(readAll(stream), "abcdef");
+}
+
+TEST(MemBlockStream, OnlyTruncationToZeroIsAResize) {
+  base::Stream stream = base::memBlockStream();
+  stream.write("abc", 3);
+  stream.worker()->setSize(3);
+  EXPECT_EQ(stream.getSize(), 3);
+  try {
+    stream.worker()->setSize(2);
+    FAIL();
+  } catch (const base::exception& error) {
+    EXPECT_STREQ(error.what(), "memBlockStream do not support resizing!");
+    EXPECT_STREQ(error.function(), "base::memBlockSetSize");
+  }
+  stream.worker()->setSize(0);
+  EXPECT_EQ(stream.getSize(), 0);
+  EXPECT_EQ(stream.getPosition(), 0);
+}
+
+TEST(ContainerStreams, WriteIntoTheCallersContainer) {
+  base::string text = "hello";
+  base::Stream stream = base::stringStream(text);
+  stream.setPosition(3);
+  stream.write("p me", 4);
+  EXPECT_EQ(text, "help me");
+  stream.worker()->setSize(4);
+  EXPECT_EQ(text, "help");
+  EXPECT_EQ(stream.getPosition(), 4);
+
+  base::vector<std::uint8_t> bytes{1, 2, 3};
+  const auto& constBytes = bytes;
+  base::Stream reader = base::vectorStream(constBytes);
+  EXPECT_EQ(reader.write("x", 1), 0u);
+  std::uint8_t out[5];
+  EXPECT_EQ(reader.read(out, 5), 3u);
+  EXPECT_TRUE(reader.isEOF());
+}
+
+}  // namespace

@@ -1,0 +1,75 @@
+#include "b_exception.h"
+#include "b_stream.h"
+#include "test_streams.h"
+
+#include <gtest/gtest.h>
+
+namespace {
+
+using testing_support::fileLikeStream;
+using testing_support::readAll;
+
+TEST(SubStream, OffsetBeyondTheParentThrowsWithTheParentsName) {
+  base::Stream parent = base::memStream("abcd", 4, "parent");
+  try {
+    base::subStream(parent, 6, 1);
+    FAIL();
+  } catch (const base::exception& error) {
+    EXPECT_STREQ(error.what(), "empty substream of 'parent'!");
+    EXPECT_STREQ(error.function(), "base::subStream");
+  }
+}
+
+TEST(SubStream, WindowIsCutAtTheParentsEnd) {
+  base::Stream parent = base::memStream("abcd", 4, "parent");
+  parent.tag = 1;
+  base::Stream window = base::subStream(parent, 2, 10);
+  EXPECT_EQ(window.getSize(), 2);
+  EXPECT_EQ(window.tag, 1u);
+  EXPECT_EQ(window.name(), "parent");
+  EXPECT_EQ(window.worker()->capabilities(), 45u);
+  EXPECT_EQ(readAll(window), "cd");
+  EXPECT_TRUE(window.isEOF());
+}
+
+TEST(SubStream, PositionsAreWindowCoordinatesAndMoveTheParent) {
+  base::Stream parent = fileLikeStream("0123456789");
+  base::Stream window = base::subStream(parent, 3, 4, "window");
+  EXPECT_EQ(window.getPosition(), 0);
+  EXPECT_EQ(window.setPosition(2), 2);
+  EXPECT_EQ(parent.getPosition(), 5);
+  EXPECT_EQ(window.setPosition(9), 4);
+  EXPECT_EQ(window.setPosition(-1, base::seekEnd), 3);
+  EXPECT_EQ(window.setPosition(-9, base::seekCurrent), 0);
+  EXPECT_EQ(readAll(window), "3456");
+}
+
+TEST(SubStream, ShortReadThrowsWithTheParentsName) {
+  // A parent without a size cannot cut the window, so the window can promise more than
+  // the parent holds.
+  base::Stream parent = fileLikeStream("abc", base::capRead | base::capPosition);
+  parent.flags |= base::throwOnShortRead;
+  base::Stream window = base::subStream(parent, 1, 10);
+  char buffer[4];
+  try {
+    window.read(buffer, 4);
+    FAIL();
+  } catch (const base::exception& error) {
+    EXPECT_STREQ(error.what(), "stream 'file-like': trying to read 4 bytes, read 2 bytes");
+  }
+}
+
+TEST(SubStream, MemoryIsNarrowedToTheWindow) {
+  const char data[] = "0123456789";
+  base::Stream parent = base::memStream(data, 10, "view");
+  base::Stream window = base::subStream(parent, 4, 3);
+  std::int64_t offset = 0, size = 0;
+  const std::uint8_t* block = window.worker()->getMemory(&offset, &size);
+  ASSERT_NE(block, nullptr);
+  EXPECT_EQ(std::string(reinterpret_cast<const char*>(block + offset), size), "456");
+  base::Stream target = base::memStream(0);
+  base::copyStream(target, window);
+  EXPECT_EQ(target.getSize(), 3);
+}
+
+}  // namespace
