@@ -24,11 +24,8 @@ bool applyLogOptions(const Options& options) {
   return false;
 }
 
-}  // namespace
-
-void printError(const std::string& text) { fmt::print(stderr, "scenetool: error: {}\n", text); }
-
 void addGlobalOptions(CLI::App& app, Options& options) {
+  app.require_subcommand(0, 1);
   app.add_flag("--version", options.version, "Print the version and exit");
   app.add_option("--log-level", options.logLevel,
                  "Log messages up to this level: 2 errors, 3 warnings (default), 4 information, 5 debug")
@@ -36,10 +33,25 @@ void addGlobalOptions(CLI::App& app, Options& options) {
   app.add_option("--log-file", options.logFile, "Also append log messages to this file");
 }
 
+// A failure that escapes a command is reported in the one error line, never as a crash.
+int runCommand(const Command& command) {
+  try {
+    return command.run();
+  } catch (const std::exception& error) {
+    printError(error.what());
+    return exitFailed;
+  }
+}
+
+}  // namespace
+
+void printError(const std::string& text) { fmt::print(stderr, "scenetool: error: {}\n", text); }
+
 int run(int argc, const char* const* argv) {
   CLI::App app(description, "scenetool");
   Options options;
   addGlobalOptions(app, options);
+  const std::vector<Command> commands{addPlyCommand(app)};
   try {
     app.parse(argc, argv);
   } catch (const CLI::CallForHelp&) {
@@ -55,12 +67,12 @@ int run(int argc, const char* const* argv) {
     return exitOk;
   }
   if (!applyLogOptions(options)) return exitFailed;
-  if (argc < 2 || app.get_subcommands().empty()) {
-    printError("no command given");
-    fmt::print(stderr, "{}", app.help());
-    return exitUsage;
+  for (const Command& command : commands) {
+    if (command.parser->parsed()) return runCommand(command);
   }
-  return exitOk;
+  printError("no command given");
+  fmt::print(stderr, "{}", app.help());
+  return exitUsage;
 }
 
 }  // namespace scenetool

@@ -2,6 +2,7 @@
 
 #include <CLI/CLI.hpp>
 
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -10,16 +11,21 @@ namespace scenetool {
 /// Exit codes: the work succeeded, the work failed, the command line was wrong.
 enum ExitCode : int { exitOk = 0, exitFailed = 1, exitUsage = 2 };
 
-/// The command line: global options and the commands. Each command registers itself on the
-/// app and sets `run`; main parses, applies the global options, then runs the command.
+/// Global options, applied before any command runs.
 struct Options {
   int logLevel = 3;
   std::string logFile;
   bool version = false;
 };
 
-/// Builds the parser with the global options bound to `options`.
-void addGlobalOptions(CLI::App& app, Options& options);
+/// A command: its parser (a subcommand of the app) and what runs when it was chosen.
+struct Command {
+  CLI::App* parser;
+  std::function<int()> run;
+};
+
+/// Registers `scenetool ply FILE [--values] [--json]`.
+Command addPlyCommand(CLI::App& app);
 
 /// Runs scenetool on the given arguments and returns the exit code.
 int run(int argc, const char* const* argv);

@@ -1,0 +1,50 @@
+#pragma once
+
+#include "ply_value.h"
+#include "ply_window.h"
+
+#include <array>
+#include <cstdint>
+#include <string_view>
+
+namespace ply {
+
+/// Bytes that make up words: - . / 0-9 A-Z \ _ a-z, and + so that "+7" and "1.5e+02" read.
+inline constexpr std::array<bool, 256> wordBytes = [] {
+  std::array<bool, 256> table{};
+  for (int c = '0'; c <= '9'; ++c) table[c] = true;
+  for (int c = 'A'; c <= 'Z'; ++c) table[c] = true;
+  for (int c = 'a'; c <= 'z'; ++c) table[c] = true;
+  for (char c : std::string_view("-./\\_+")) table[static_cast<unsigned char>(c)] = true;
+  return table;
+}();
+
+/// Space, tab, CR and LF.
+inline bool isBlank(int c) { return c == ' ' || c == '\t' || c == '\r' || c == '\n'; }
+
+/// Consumes blanks; stops quietly at the end of the data.
+void skipBlanks(ByteWindow& window);
+
+/// Consumes the rest of the line: up to and including the first NUL, LF or CR, then any
+/// further CR, LF and NUL bytes.
+void skipLine(ByteWindow& window);
+
+/// Reads words. A word's text stays valid until the next call.
+class WordReader {
+public:
+  /// Skips blanks, then takes word bytes. Empty when the next byte is no word byte or the
+  /// data ends. Words longer than 1024 bytes are consumed whole but cut in what is returned.
+  std::string_view read(ByteWindow& window);
+
+private:
+  static constexpr std::size_t maxWord = 1024;
+  std::array<char, maxWord> m_copy{};
+};
+
+/// The value of an ASCII word read as `type`: integers from their leading digits (an
+/// optional sign for the signed types; unsigned types give 0 for a sign), floats as the
+/// correctly rounded nearest value, "nan" and "inf"/"infinity" in any case as NaN and
+/// infinities; bytes after the number are ignored and a word without a number gives 0.
+Value parseAsciiValue(std::string_view word, DataType type);
+
+}  // namespace ply

@@ -1,0 +1,88 @@
+#include "ply_window.h"
+
+#include "b_exception.h"
+
+#include <fmt/format.h>
+
+#include <algorithm>
+#include <cstring>
+
+namespace ply {
+
+ByteWindow::ByteWindow(base::Stream& stream, std::uint32_t capacity)
+    : m_stream(stream),
+      m_capacity(capacity),
+      m_inMemory(stream.has(base::capInMemory)),
+      // A stream used directly keeps its flags; buffered reading never reports short reads.
+      m_throwOnShortRead(m_inMemory && (stream.flags & base::throwOnShortRead)) {
+  if (stream.has(base::capPosition)) m_origin = stream.getPosition();
+  if (m_inMemory) {
+    std::int64_t offset = 0;
+    std::int64_t size = 0;
+    const std::uint8_t* block = stream.worker()->getMemory(&offset, &size);
+    const std::int64_t start = std::clamp<std::int64_t>(m_origin, 0, size);
+    m_begin = m_cursor = block ? block + offset + start : nullptr;
+    m_end = block ? block + offset + size : nullptr;
+    return;
+  }
+  m_buffer.resize(m_capacity);
+  m_begin = m_cursor = m_end = m_buffer.data();
+}
+
+ByteWindow::~ByteWindow() {
+  if (m_stream.has(base::capPosition)) m_stream.setPosition(m_origin + static_cast<std::int64_t>(position()));
+}
+
+std::optional<std::uint64_t> ByteWindow::remaining() const {
+  if (m_inMemory) return static_cast<std::uint64_t>(m_end - m_cursor);
+  if (!m_stream.has(base::capSize)) return std::nullopt;
+  const std::int64_t left = m_stream.getSize() - m_origin - static_cast<std::int64_t>(position());
+  return static_cast<std::uint64_t>(std::max<std::int64_t>(left, 0));
+}
+
+bool ByteWindow::refill(std::size_t count) {
+  if (m_inMemory || !m_stream.has(base::capRead)) return false;
+  // Keep one consumed byte so that unget() works across a refill.
+  const std::size_t keep = m_cursor > m_begin ? 1 : 0;
+  const std::size_t unread = static_cast<std::size_t>(m_end - m_cursor);
+  if (keep + count > m_buffer.size()) m_buffer.resize(keep + count);
+  std::uint8_t* front = m_buffer.data();
+  const std::uint8_t* from = m_cursor - keep;
+  m_consumedBefore += static_cast<std::uint64_t>(from - m_begin);
+  std::memmove(front, from, keep + unread);
+  m_begin = front;
+  m_cursor = front + keep;
+  std::uint8_t* fill = front + keep + unread;
+  const std::uint8_t* limit = front + m_buffer.size();
+  while (static_cast<std::size_t>(fill - m_cursor) < count) {
+    const std::uint32_t got = m_stream.worker()->read(fill, static_cast<std::uint32_t>(limit - fill));
+    if (got == 0) break;
+    fill += got;
+  }
+  m_end = fill;
+  return static_cast<std::size_t>(m_end - m_cursor) >= count;
+}
+
+const std::uint8_t* ByteWindow::failShort(std::size_t count) {
+  if (m_throwOnShortRead) {
+    base::raise<base::exception>("base::Stream::read",
+                                 fmt::format("stream '{}': trying to read {} bytes, read {} bytes", m_stream.name(),
+                                             count, static_cast<std::size_t>(m_end - m_cursor)));
+  }
+  return nullptr;
+}
+
+bool ByteWindow::skip(std::uint64_t count) {
+  for (;;) {
+    const auto inWindow = static_cast<std::uint64_t>(m_end - m_cursor);
+    if (count <= inWindow) {
+      m_cursor += count;
+      return true;
+    }
+    count -= inWindow;
+    m_cursor = m_end;
+    if (!refill(1)) return failShort(static_cast<std::size_t>(std::min<std::uint64_t>(count, SIZE_MAX))) != nullptr;
+  }
+}
+
+}  // namespace ply

@@ -1,0 +1,29 @@
+#include "file_input.h"
+
+#include <cerrno>
+#include <cstdio>
+#include <cstring>
+#include <memory>
+
+namespace scenetool {
+
+bool readWholeFile(const std::string& path, base::vector<std::uint8_t>& data, std::string& error) {
+  std::unique_ptr<std::FILE, int (*)(std::FILE*)> file(std::fopen(path.c_str(), "rb"), &std::fclose);
+  if (!file) {
+    error = std::strerror(errno);
+    return false;
+  }
+  data.clear();
+  std::uint8_t piece[1 << 16];
+  for (std::size_t got; (got = std::fread(piece, 1, sizeof piece, file.get())) > 0;) {
+    base::reserveForAppend(data, got);
+    data.insert(data.end(), piece, piece + got);
+  }
+  if (std::ferror(file.get())) {
+    error = std::strerror(errno);
+    return false;
+  }
+  return true;
+}
+
+}  // namespace scenetool
