@@ -1,0 +1,154 @@
+#include "log_capture.h"
+#include "ply_parser.h"
+#include "test_streams.h"
+
+#include <gtest/gtest.h>
+
+#include <string>
+
+namespace {
+
+using namespace std::string_literals;
+using testing_support::LogCapture;
+
+struct Parsed {
+  bool ok;
+  ply::Header header;
+  std::vector<std::string> log;
+  std::uint64_t tag;
+  std::int64_t position;
+};
+
+Parsed parse(const std::string& text) {
+  LogCapture capture(base::logWarning);
+  base::Stream stream = base::memStream(text.data(), static_cast<std::int64_t>(text.size()));
+  Parsed result{};
+  result.ok = ply::parseHeader(result.header, stream);
+  result.log = capture.texts();
+  result.tag = stream.tag;
+  result.position = stream.getPosition();
+  return result;
+}
+
+std::string lastMessage(const Parsed& parsed) { return parsed.log.empty() ? "" : parsed.log.back(); }
+
+TEST(PlyHeader, MagicWordInAnyCaseAfterBlanks) {
+  EXPECT_TRUE(parse("PLY\nformat ascii 1.0\nend_header\n").ok);
+  EXPECT_TRUE(parse("\n  Ply\nformat ascii 1.0\nend_header\n").ok);
+  for (const char* text : {"plyx\nformat ascii 1.0\nend_header\n", "", "format ascii 1.0\n"}) {
+    const Parsed parsed = parse(text);
+    EXPECT_FALSE(parsed.ok);
+    EXPECT_EQ(lastMessage(parsed), "Invalid .ply file: Magic number 'ply' is not there.") << text;
+  }
+}
+
+TEST(PlyHeader, FormatLine) {
+  EXPECT_EQ(lastMessage(parse("ply\ncomment made by hand\nformat ascii 1.0\nend_header\n")),
+            "Invalid .ply file: Missing format specification");
+  EXPECT_EQ(lastMessage(parse("ply\nformat binary 1.0\nend_header\n")), "Invalid .ply file: Unknown file format binary");
+  // The version is neither read nor checked.
+  EXPECT_TRUE(parse("ply\nformat ascii 7.5\nend_header\n").ok);
+  EXPECT_TRUE(parse("ply\nformat ascii\nend_header\n").ok);
+  const Parsed big = parse("ply\nformat binary_big_endian 1.0\nend_header\n");
+  EXPECT_EQ(big.header.encoding, ply::Encoding::binaryBigEndian);
+  EXPECT_EQ(big.tag, 1u);
+  const Parsed little = parse("ply\nformat binary_little_endian 1.0\nend_header\n");
+  EXPECT_EQ(little.header.encoding, ply::Encoding::binaryLittleEndian);
+  EXPECT_EQ(little.tag, 0u);
+}
+
+TEST(PlyHeader, ElementsAndPropertiesWithTheirSemantics) {
+  const Parsed parsed = parse(
+      "ply\nformat ascii 1.0\nelement vertex 8\nproperty float x\nproperty uchar red\nproperty float tx\n"
+      "property float32 quality\nelement face 2\nproperty list uchar int vertex_indices\n"
+      "element weird 0\nproperty int8 w\nend_header\n");
+  ASSERT_TRUE(parsed.ok);
+  ASSERT_EQ(parsed.header.elements.size(), 3u);
+  const ply::Element& vertex = parsed.header.elements[0];
+  EXPECT_EQ(vertex.semantic, ply::ElementSemantic::vertex);
+  EXPECT_EQ(vertex.name, "");
+  EXPECT_EQ(vertex.count, 8u);
+  ASSERT_EQ(vertex.properties.size(), 4u);
+  EXPECT_EQ(vertex.properties[0].type, ply::DataType::float32);
+  EXPECT_EQ(vertex.properties[0].semantic, ply::PropertySemantic::x);
+  EXPECT_EQ(vertex.properties[1].type, ply::DataType::uint8);
+  EXPECT_EQ(vertex.properties[1].semantic, ply::PropertySemantic::red);
+  EXPECT_EQ(vertex.properties[2].semantic, ply::PropertySemantic::u);
+  EXPECT_EQ(vertex.properties[3].semantic, ply::PropertySemantic::unknown);
+  EXPECT_EQ(vertex.properties[3].name, "quality");
+  const ply::Property& indices = parsed.header.elements[1].properties.at(0);
+  EXPECT_TRUE(indices.isList);
+  EXPECT_EQ(indices.countType, ply::DataType::uint8);
+  EXPECT_EQ(indices.type, ply::DataType::int32);
+  EXPECT_EQ(indices.semantic, ply::PropertySemantic::vertexIndex);
+  EXPECT_EQ(parsed.header.elements[2].semantic, ply::ElementSemantic::unknown);
+  EXPECT_EQ(parsed.header.elements[2].name, "weird");
+  EXPECT_EQ(parsed.log, (std::vector<std::string>{"Found unknown property semantic in PLY file: quality!",
+                                                  "Found unknown element semantic in PLY file: weird!",
+                                                  "Found unknown property semantic in PLY file: w!"}));
+}
+
+TEST(PlyHeader, CountWords) {
+  EXPECT_EQ(parse("ply\nformat ascii 1.0\nelement vertex 8abc\nend_header\n").header.elements.at(0).count, 8u);
+  EXPECT_EQ(parse("ply\nformat ascii 1.0\nelement vertex -5\nend_header\n").header.elements.at(0).count, 0u);
+  const Parsed overflow = parse("ply\nformat ascii 1.0\nelement vertex 4294967296\nend_header\n");
+  EXPECT_FALSE(overflow.ok);
+  EXPECT_EQ(lastMessage(overflow), "Invalid .ply file: the count 4294967296 of element 'vertex' does not fit in 32 bits");
+}
+
+TEST(PlyHeader, UnknownTypesFailTheHeader) {
+  const Parsed scalar = parse("ply\nformat ascii 1.0\nelement vertex 1\nproperty bool flag\nend_header\n1\n");
+  EXPECT_FALSE(scalar.ok);
+  EXPECT_EQ(lastMessage(scalar), "Found unknown data type in PLY file: bool!");
+  const Parsed count = parse("ply\nformat ascii 1.0\nelement face 1\nproperty list byte int vertex_indices\nend_header\n");
+  EXPECT_FALSE(count.ok);
+  EXPECT_EQ(lastMessage(count), "Found unknown data type in PLY file: byte!");
+}
+
+TEST(PlyHeader, KeywordsAreCaseSensitiveAndUnknownLinesAreSkipped) {
+  const Parsed parsed = parse("ply\nformat ascii 1.0\nobj_info made here\nELEMENT vertex 1\ncomment quiet\nend_header\n");
+  EXPECT_TRUE(parsed.ok);
+  EXPECT_TRUE(parsed.header.elements.empty());
+  EXPECT_EQ(parsed.log, (std::vector<std::string>{"Skipped unknown header element obj_info!",
+                                                  "Skipped unknown header element ELEMENT!"}));
+  const Parsed noEnd = parse("ply\nformat ascii 1.0\nelement vertex 0\nEND_HEADER\n");
+  EXPECT_FALSE(noEnd.ok);
+  EXPECT_EQ(lastMessage(noEnd), "Error reading ply header.");
+}
+
+TEST(PlyHeader, PropertyBeforeAnyElementFails) {
+  const Parsed parsed = parse("ply\nformat ascii 1.0\nproperty float x\nelement vertex 0\nend_header\n");
+  EXPECT_FALSE(parsed.ok);
+  EXPECT_EQ(lastMessage(parsed), "Invalid .ply file: property declared before any element");
+}
+
+TEST(PlyHeader, OnlyOneLineBreakEndsTheHeader) {
+  // Each body starts with a byte that is also white space; it must stay in the body.
+  for (const std::string breakAndBody : {"\n\n\x01", "\r\n\r\x01", "\r\r\x01", "\r \x01", "\n\t\x01"}) {
+    const std::string head = "ply\r\nformat binary_little_endian 1.0\r\nelement vertex 1\r\nproperty uchar a\r\n"
+                             "property uchar b\r\nend_header \t";
+    const Parsed parsed = parse(head + breakAndBody);
+    ASSERT_TRUE(parsed.ok);
+    const std::size_t lineBreak = breakAndBody[0] == '\r' && breakAndBody[1] == '\n' ? 2 : 1;
+    EXPECT_EQ(parsed.position, static_cast<std::int64_t>(head.size() + lineBreak));
+  }
+}
+
+TEST(PlyHeader, CountsMustFitInTheBytesThatFollow) {
+  const Parsed binary = parse(
+      "ply\nformat binary_little_endian 1.0\nelement vertex 1000000000\nproperty float x\nproperty float y\n"
+      "end_header\n0123456789");
+  EXPECT_FALSE(binary.ok);
+  EXPECT_EQ(lastMessage(binary),
+            "Invalid .ply file: element 'vertex' declares 1000000000 instances of at least 8 bytes each, but only 10 "
+            "bytes follow the header");
+  // ASCII: two bytes a value, but the last one needs no separator.
+  EXPECT_TRUE(parse("ply\nformat ascii 1.0\nelement vertex 2\nproperty uchar a\nend_header\n1 2").ok);
+  EXPECT_FALSE(parse("ply\nformat ascii 1.0\nelement vertex 3\nproperty uchar a\nend_header\n1 2").ok);
+  // Lists count at their count's size; an element without properties holds no data.
+  EXPECT_TRUE(parse("ply\nformat binary_little_endian 1.0\nelement face 4\nproperty list uchar int i\n"
+                    "element nothing 4000000000\nend_header\n\0\0\0\0"s)
+                  .ok);
+}
+
+}  // namespace
