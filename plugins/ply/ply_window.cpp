@@ -45,11 +45,12 @@ bool ByteWindow::refill(std::size_t count) {
   // Keep one consumed byte so that unget() works across a refill.
   const std::size_t keep = m_cursor > m_begin ? 1 : 0;
   const std::size_t unread = static_cast<std::size_t>(m_end - m_cursor);
+  const std::size_t from = static_cast<std::size_t>(m_cursor - m_buffer.data()) - keep;
+  m_consumedBefore += static_cast<std::uint64_t>(m_cursor - m_begin) - keep;
+  // Growing moves the block: the pointers are rebuilt from offsets below.
   if (keep + count > m_buffer.size()) m_buffer.resize(keep + count);
   std::uint8_t* front = m_buffer.data();
-  const std::uint8_t* from = m_cursor - keep;
-  m_consumedBefore += static_cast<std::uint64_t>(from - m_begin);
-  std::memmove(front, from, keep + unread);
+  std::memmove(front, front + from, keep + unread);
   m_begin = front;
   m_cursor = front + keep;
   std::uint8_t* fill = front + keep + unread;

@@ -61,7 +61,8 @@ TEST(PlyHeader, ElementsAndPropertiesWithTheirSemantics) {
   const Parsed parsed = parse(
       "ply\nformat ascii 1.0\nelement vertex 8\nproperty float x\nproperty uchar red\nproperty float tx\n"
       "property float32 quality\nelement face 2\nproperty list uchar int vertex_indices\n"
-      "element weird 0\nproperty int8 w\nend_header\n");
+      "element weird 0\nproperty int8 w\nend_header\n" +
+      std::string(80, '1'));
   ASSERT_TRUE(parsed.ok);
   ASSERT_EQ(parsed.header.elements.size(), 3u);
   const ply::Element& vertex = parsed.header.elements[0];
