@@ -1,0 +1,238 @@
+// Reading speed of the PLY reader against a floor measured in the same run: reading the file
+// into memory and splitting its values into columns with the plainest loop (binary: copy and
+// swap the records; ASCII: std::from_chars over every number). Both sides produce the same
+// column arrays from the same file on disk.
+
+#include "ply_bench_files.h"
+#include "ply_parser.h"
+
+#include <benchmark/benchmark.h>
+
+#include <algorithm>
+#include <charconv>
+#include <cstdio>
+#include <cstring>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+namespace {
+
+using bench::Encoding;
+using bench::Shape;
+
+// What both sides fill: one float column per scalar property, list items and counts.
+struct Columns {
+  std::vector<std::vector<float>> scalars;
+  std::vector<std::int32_t> items;
+  std::vector<std::uint32_t> counts;
+};
+
+// A file read through the stream interface, not in memory: the way an importer reads.
+class FileSource final : public base::StreamWorker {
+public:
+  explicit FileSource(const std::string& path)
+      : StreamWorker(base::capRead | base::capPosition | base::capSize, path), m_file(std::fopen(path.c_str(), "rb")) {
+    std::fseek(m_file, 0, SEEK_END);
+    m_size = std::ftell(m_file);
+    std::fseek(m_file, 0, SEEK_SET);
+  }
+  ~FileSource() override { std::fclose(m_file); }
+  std::uint32_t read(void* buffer, std::uint32_t count) override {
+    return static_cast<std::uint32_t>(std::fread(buffer, 1, count, m_file));
+  }
+  std::int64_t setPosition(std::int64_t offset, std::uint32_t) override {
+    std::fseek(m_file, static_cast<long>(offset), SEEK_SET);
+    return getPosition();
+  }
+  std::int64_t getPosition() override { return std::ftell(m_file); }
+  std::int64_t getSize() override { return m_size; }
+  bool isEOF() override { return getPosition() >= m_size; }
+
+private:
+  std::FILE* m_file;
+  std::int64_t m_size = 0;
+};
+
+class ColumnReceiver {
+public:
+  explicit ColumnReceiver(Columns& columns) : m_columns(columns) {}
+
+  bool plyElement(const ply::Element& element) {
+    m_first = m_columns.scalars.size();
+    for (const ply::Property& property : element.properties) {
+      m_columns.scalars.emplace_back();
+      if (!property.isList) m_columns.scalars.back().reserve(element.count);
+    }
+    return true;
+  }
+  void beginInstance(std::uint32_t) {}
+  void plyProperty(const ply::Element& element, const ply::Property& property, const ply::ValueArray& values) {
+    if (!property.isList) {
+      m_columns.scalars[m_first + static_cast<std::size_t>(&property - element.properties.data())].push_back(
+          values[0].convertTo<float>(property.type));
+      return;
+    }
+    m_columns.counts.push_back(static_cast<std::uint32_t>(values.size()));
+    for (const ply::Value& value : values) m_columns.items.push_back(value.i);
+  }
+
+private:
+  Columns& m_columns;
+  std::size_t m_first = 0;
+};
+
+// The layout the floor loops know in advance: per element its count and per property
+// whether it is a float, a uchar, or a list of ints with a uchar count.
+enum class Kind { real, byte, list };
+struct ElementLayout {
+  std::size_t count;
+  std::vector<Kind> kinds;
+};
+
+std::vector<ElementLayout> layout(Shape shape) {
+  using enum Kind;
+  if (shape == Shape::mesh) {
+    return {{1'000'000, {real, real, real, real, real, real, byte, byte, byte, byte, real, real}},
+            {2'000'000, {list}}};
+  }
+  return {{2'000'000, {real, real, real, byte, byte, byte}}};
+}
+
+std::vector<char> readWhole(const std::string& path) {
+  std::vector<char> data(std::filesystem::file_size(path));
+  std::FILE* file = std::fopen(path.c_str(), "rb");
+  const std::size_t got = std::fread(data.data(), 1, data.size(), file);
+  std::fclose(file);
+  data.resize(got);
+  return data;
+}
+
+const char* bodyStart(const std::vector<char>& data) {
+  const char* marker = "end_header\n";
+  return std::search(data.data(), data.data() + data.size(), marker, marker + std::strlen(marker)) + std::strlen(marker);
+}
+
+template <bool Swap>
+std::uint32_t load32(const char* at) {
+  std::uint32_t raw;
+  std::memcpy(&raw, at, 4);
+  return Swap ? __builtin_bswap32(raw) : raw;
+}
+
+template <bool Swap>
+void splitBinary(const std::vector<char>& data, Shape shape, Columns& columns) {
+  const char* at = bodyStart(data);
+  for (const ElementLayout& element : layout(shape)) {
+    const std::size_t first = columns.scalars.size();
+    columns.scalars.resize(first + element.kinds.size());
+    for (auto& column : columns.scalars) column.reserve(element.count);
+    for (std::size_t i = 0; i < element.count; ++i) {
+      for (std::size_t p = 0; p < element.kinds.size(); ++p) {
+        switch (element.kinds[p]) {
+          case Kind::real: columns.scalars[first + p].push_back(std::bit_cast<float>(load32<Swap>(at))); at += 4; break;
+          case Kind::byte: columns.scalars[first + p].push_back(static_cast<unsigned char>(*at)); at += 1; break;
+          case Kind::list: {
+            const auto count = static_cast<unsigned char>(*at++);
+            columns.counts.push_back(count);
+            for (unsigned k = 0; k < count; ++k, at += 4) columns.items.push_back(static_cast<std::int32_t>(load32<Swap>(at)));
+            break;
+          }
+        }
+      }
+    }
+  }
+}
+
+void splitAscii(const std::vector<char>& data, Shape shape, Columns& columns) {
+  const char* at = bodyStart(data);
+  const char* end = data.data() + data.size();
+  auto skipBlanks = [&] { while (at != end && (*at == ' ' || *at == '\n' || *at == '\r' || *at == '\t')) ++at; };
+  auto number = [&](auto& value) {
+    skipBlanks();
+    at = std::from_chars(at, end, value).ptr;
+  };
+  for (const ElementLayout& element : layout(shape)) {
+    const std::size_t first = columns.scalars.size();
+    columns.scalars.resize(first + element.kinds.size());
+    for (auto& column : columns.scalars) column.reserve(element.count);
+    for (std::size_t i = 0; i < element.count; ++i) {
+      for (std::size_t p = 0; p < element.kinds.size(); ++p) {
+        if (element.kinds[p] != Kind::list) {
+          float value = 0;
+          if (element.kinds[p] == Kind::real) {
+            number(value);
+          } else {
+            unsigned byte = 0;
+            number(byte);
+            value = static_cast<float>(byte);
+          }
+          columns.scalars[first + p].push_back(value);
+          continue;
+        }
+        unsigned count = 0;
+        number(count);
+        columns.counts.push_back(count);
+        for (unsigned k = 0; k < count; ++k) {
+          std::int32_t item = 0;
+          number(item);
+          columns.items.push_back(item);
+        }
+      }
+    }
+  }
+}
+
+void setRate(benchmark::State& state, const std::string& path) {
+  state.SetBytesProcessed(static_cast<std::int64_t>(state.iterations() * std::filesystem::file_size(path)));
+}
+
+void BM_PlyParse(benchmark::State& state, Shape shape, Encoding encoding) {
+  const std::string path = bench::plyFile(shape, encoding);
+  for (auto _ : state) {
+    Columns columns;
+    ColumnReceiver receiver(columns);
+    base::Stream stream = base::Stream::adopt(new FileSource(path));
+    ply::Header header;
+    if (!ply::parseFile(header, stream, receiver)) state.SkipWithError("parse failed");
+    benchmark::DoNotOptimize(columns.items.data());
+  }
+  setRate(state, path);
+}
+
+void BM_FloorReadFile(benchmark::State& state, Shape shape, Encoding encoding) {
+  const std::string path = bench::plyFile(shape, encoding);
+  for (auto _ : state) benchmark::DoNotOptimize(readWhole(path).data());
+  setRate(state, path);
+}
+
+void BM_FloorSplit(benchmark::State& state, Shape shape, Encoding encoding) {
+  const std::string path = bench::plyFile(shape, encoding);
+  for (auto _ : state) {
+    Columns columns;
+    const std::vector<char> data = readWhole(path);
+    switch (encoding) {
+      case Encoding::ascii: splitAscii(data, shape, columns); break;
+      case Encoding::little: splitBinary<false>(data, shape, columns); break;
+      case Encoding::big: splitBinary<true>(data, shape, columns); break;
+    }
+    benchmark::DoNotOptimize(columns.items.data());
+  }
+  setRate(state, path);
+}
+
+#define PLY_BENCH(shape, encoding)                                                                              \
+  BENCHMARK_CAPTURE(BM_PlyParse, shape##_##encoding, Shape::shape, Encoding::encoding)->Unit(benchmark::kMillisecond); \
+  BENCHMARK_CAPTURE(BM_FloorSplit, shape##_##encoding, Shape::shape, Encoding::encoding)                            \
+      ->Unit(benchmark::kMillisecond);                                                                               \
+  BENCHMARK_CAPTURE(BM_FloorReadFile, shape##_##encoding, Shape::shape, Encoding::encoding)                         \
+      ->Unit(benchmark::kMillisecond)
+
+PLY_BENCH(mesh, ascii);
+PLY_BENCH(mesh, little);
+PLY_BENCH(mesh, big);
+PLY_BENCH(cloud, ascii);
+PLY_BENCH(cloud, little);
+PLY_BENCH(cloud, big);
+
+}  // namespace
