@@ -5,7 +5,6 @@
 
 #include <cstdint>
 #include <exception>
-#include <source_location>
 #include <string_view>
 #include <type_traits>
 #include <utility>
@@ -21,8 +20,10 @@ struct ThrowSite {
   const char* file;
   unsigned line;
 
-  ThrowSite(const char* functionName, std::source_location where = std::source_location::current())
-      : function(functionName), file(where.file_name()), line(where.line()) {}
+  // The builtins give the caller's place, like std::source_location, on every compiler
+  // the project builds with.
+  ThrowSite(const char* functionName, const char* callerFile = __builtin_FILE(), unsigned callerLine = __builtin_LINE())
+      : function(functionName), file(callerFile), line(callerLine) {}
 };
 
 /// The root of every failure that a caller cannot test for. It records where it was raised

@@ -133,9 +133,10 @@ bool bodyCanHoldCounts(const Header& header, std::uint64_t available) {
     needed += instance * element.count;
     if (needed > available) {
       return fail(
-          "Invalid .ply file: element '{}' declares {} instances of at least {} bytes each, but only {} bytes follow "
-          "the header",
-          displayName(element), element.count, instance, available - (header.encoding == Encoding::ascii));
+          "Invalid .ply file: element '{}' declares {} instances of at least {} bytes each; the elements up to it need "
+          "at least {} bytes, but only {} bytes follow the header",
+          displayName(element), element.count, instance, needed - (header.encoding == Encoding::ascii),
+          available - (header.encoding == Encoding::ascii));
     }
   }
   return true;

@@ -120,7 +120,12 @@ Value parseAsciiValue(std::string_view word, DataType type) {
     }
     case DataType::uint8:
     case DataType::uint16:
-    case DataType::uint32: value.u = leadingDigits(word); break;
+    case DataType::uint32:
+      // "+3" is 3 (read as 0 it would also shift every later value after a list count);
+      // a minus sign still gives 0.
+      if (!word.empty() && word.front() == '+') word.remove_prefix(1);
+      value.u = leadingDigits(word);
+      break;
     case DataType::float32: value.f = parseReal<float>(word); break;
     case DataType::float64: value.d = parseReal<double>(word); break;
     case DataType::none: break;

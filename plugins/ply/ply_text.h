@@ -41,8 +41,8 @@ private:
   std::array<char, maxWord> m_copy{};
 };
 
-/// The value of an ASCII word read as `type`: integers from their leading digits (an
-/// optional sign for the signed types; unsigned types give 0 for a sign), floats as the
+/// The value of an ASCII word read as `type`: integers from their leading digits after an
+/// optional sign (a minus sign gives 0 for the unsigned types), floats as the
 /// correctly rounded nearest value, "nan" and "inf"/"infinity" in any case as NaN and
 /// infinities; bytes after the number are ignored and a word without a number gives 0.
 Value parseAsciiValue(std::string_view word, DataType type);

@@ -66,7 +66,7 @@ TEST(PlyAscii, FloatsAreRoundedOnceToTheNearestFloat) {
 TEST(PlyAscii, IntegerWords) {
   const Read r = read(asciiFile("property uchar a\nproperty char b\nproperty char c\nproperty uint d\nproperty int e\n",
                                 1, "-1 -1 300 +5 +5\n"));
-  EXPECT_EQ(r.recorder.instances, (std::vector<std::string>{"0 -1 300 0 5"}));
+  EXPECT_EQ(r.recorder.instances, (std::vector<std::string>{"0 -1 300 5 5"}));
 }
 
 TEST(PlyAscii, NumbersIgnoreTheLocale) {

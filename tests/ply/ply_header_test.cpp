@@ -141,8 +141,8 @@ TEST(PlyHeader, CountsMustFitInTheBytesThatFollow) {
       "end_header\n0123456789");
   EXPECT_FALSE(binary.ok);
   EXPECT_EQ(lastMessage(binary),
-            "Invalid .ply file: element 'vertex' declares 1000000000 instances of at least 8 bytes each, but only 10 "
-            "bytes follow the header");
+            "Invalid .ply file: element 'vertex' declares 1000000000 instances of at least 8 bytes each; the elements "
+            "up to it need at least 8000000000 bytes, but only 10 bytes follow the header");
   // ASCII: two bytes a value, but the last one needs no separator.
   EXPECT_TRUE(parse("ply\nformat ascii 1.0\nelement vertex 2\nproperty uchar a\nend_header\n1 2").ok);
   EXPECT_FALSE(parse("ply\nformat ascii 1.0\nelement vertex 3\nproperty uchar a\nend_header\n1 2").ok);
