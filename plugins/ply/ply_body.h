@@ -242,6 +242,7 @@ private:
       std::string_view word;
       if (const Status status = nextWord(word); status != Status::ok) return status;
       if (!property.isList) {
+        if (!deliver) continue;
         m_values.resize(1);
         m_values[0] = parseAsciiValue(word, property.type);
       } else if (const Status status = readList(property, word, deliver); status != Status::ok) {

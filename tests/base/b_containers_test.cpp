@@ -6,12 +6,6 @@
 
 namespace {
 
-TEST(Containers, StringKeepsFifteenCharactersInline) {
-  base::string text("fifteen chars!!");
-  ASSERT_EQ(text.size(), 15u);
-  EXPECT_EQ(text.capacity(), 15u);
-}
-
 TEST(GrowthRule, OneElementThenDoublingUpToOneMiB) {
   EXPECT_EQ(base::grownCapacity(0, 4, 1), 1u);
   EXPECT_EQ(base::grownCapacity(1, 4, 2), 2u);

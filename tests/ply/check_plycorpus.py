@@ -26,8 +26,8 @@ HEADER_FAILURES = {
     "plywoot__ascii.ply": ("Error reading ply header.", "the file ends after the format line"),
     "plywoot__invalid.ply": ("Magic number 'ply' is not there", "text file, no magic word"),
     "plywoot__invalid_format.ply": ("Unknown file format some_invalid_format", "unknown encoding"),
-    "plywoot__missing_format.ply": ("Missing format specification", "a comment line comes first"),
-    "plywoot__valid.ply": ("Missing format specification", "nothing after the magic word"),
+    "plywoot__missing_format.ply": ("Missing format", "a comment line comes first"),
+    "plywoot__valid.ply": ("Missing format", "nothing after the magic word"),
     # Intended divergences: the oracle reads past the header of these.
     "pyntcloud__diamond_with_bool.ply":
         ("unknown data type in PLY file: bool", "an unknown type word would shift every later value, so the header fails"),
