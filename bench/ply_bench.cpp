@@ -113,6 +113,14 @@ const char* bodyStart(const std::vector<char>& data) {
   return std::search(data.data(), data.data() + data.size(), marker, marker + std::strlen(marker)) + std::strlen(marker);
 }
 
+// Adds the element's columns with room for its values; returns the first one's index.
+std::size_t addColumns(Columns& columns, const ElementLayout& element) {
+  const std::size_t first = columns.scalars.size();
+  columns.scalars.resize(first + element.kinds.size());
+  for (std::size_t p = first; p < columns.scalars.size(); ++p) columns.scalars[p].reserve(element.count);
+  return first;
+}
+
 template <bool Swap>
 std::uint32_t load32(const char* at) {
   std::uint32_t raw;
@@ -124,9 +132,7 @@ template <bool Swap>
 void splitBinary(const std::vector<char>& data, Shape shape, Columns& columns) {
   const char* at = bodyStart(data);
   for (const ElementLayout& element : layout(shape)) {
-    const std::size_t first = columns.scalars.size();
-    columns.scalars.resize(first + element.kinds.size());
-    for (auto& column : columns.scalars) column.reserve(element.count);
+    const std::size_t first = addColumns(columns, element);
     for (std::size_t i = 0; i < element.count; ++i) {
       for (std::size_t p = 0; p < element.kinds.size(); ++p) {
         switch (element.kinds[p]) {
@@ -153,9 +159,7 @@ void splitAscii(const std::vector<char>& data, Shape shape, Columns& columns) {
     at = std::from_chars(at, end, value).ptr;
   };
   for (const ElementLayout& element : layout(shape)) {
-    const std::size_t first = columns.scalars.size();
-    columns.scalars.resize(first + element.kinds.size());
-    for (auto& column : columns.scalars) column.reserve(element.count);
+    const std::size_t first = addColumns(columns, element);
     for (std::size_t i = 0; i < element.count; ++i) {
       for (std::size_t p = 0; p < element.kinds.size(); ++p) {
         if (element.kinds[p] != Kind::list) {

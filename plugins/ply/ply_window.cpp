@@ -74,6 +74,16 @@ const std::uint8_t* ByteWindow::failShort(std::size_t count) {
 }
 
 bool ByteWindow::skip(std::uint64_t count) {
+  // A far skip seeks instead of reading what it passes over, when the size says the bytes
+  // are there.
+  const auto inWindow = static_cast<std::uint64_t>(m_end - m_cursor);
+  const std::optional<std::uint64_t> left = remaining();
+  if (count > inWindow && !m_inMemory && m_stream.has(base::capPosition) && left && *left >= count) {
+    m_consumedBefore = position() + count;
+    m_stream.setPosition(m_origin + static_cast<std::int64_t>(m_consumedBefore));
+    m_begin = m_cursor = m_end = m_buffer.data();
+    return true;
+  }
   for (;;) {
     const auto inWindow = static_cast<std::uint64_t>(m_end - m_cursor);
     if (count <= inWindow) {

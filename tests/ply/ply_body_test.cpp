@@ -173,6 +173,17 @@ TEST(PlyBinary, DeclinedElementsAreReadPastInBothEncodings) {
   EXPECT_EQ(a.recorder.instances, (std::vector<std::string>{"42"}));
 }
 
+TEST(PlyBinary, LargeDeclinedElementIsPassedOverInBothSources) {
+  const std::string file = "ply\nformat binary_little_endian 1.0\nelement skipme 100000\nproperty double d\n"
+                           "element vertex 1\nproperty uchar x\nend_header\n"s +
+                           std::string(800000, '\x55') + "\x2A"s;
+  for (bool inMemory : {true, false}) {
+    const Read r = read(file, inMemory, [](const ply::Element& e) { return e.semantic == ply::ElementSemantic::vertex; });
+    EXPECT_EQ(r.result, ply::ReadResult::complete);
+    EXPECT_EQ(r.recorder.instances, (std::vector<std::string>{"42"}));
+  }
+}
+
 TEST(PlyBinary, DeclinedElementRunningPastTheEndFailsLikeARead) {
   const std::string file = "ply\nformat binary_little_endian 1.0\nelement skipme 2\nproperty list uchar int l\n"
                            "end_header\n\x01\x00\x00\x00\x00\x05\x00"s;
