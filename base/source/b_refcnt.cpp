@@ -36,7 +36,13 @@ void WeakList::clear() {
 
 }  // namespace detail
 
-RefCntAtomic::~RefCntAtomic() = default;
+// An object destroyed without its last release (one on the stack, say) still leaves no
+// weak reference dangling.
+RefCntAtomic::~RefCntAtomic() {
+  m_lock.lock();
+  m_weak.clear();
+  m_lock.unlock();
+}
 
 bool RefCntAtomic::release() {
   if (m_count.fetch_sub(1, std::memory_order_acq_rel) != 1) return false;
@@ -77,7 +83,7 @@ void RefCntAtomic::detachWeak(WeakNode& node) {
   }
 }
 
-RefCnt::~RefCnt() = default;
+RefCnt::~RefCnt() { m_weak.clear(); }
 
 bool RefCnt::release() {
   if (--m_count != 0) return false;

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <memory>
 #include <thread>
 #include <vector>
 
@@ -71,6 +72,16 @@ TEST(WeakRef, HolderGoingFirstUnlinksItsNode) {
   EXPECT_TRUE(survivor.expired());
 }
 
+TEST(WeakRef, ObjectDestroyedWithoutReleaseClearsItsWeakReferences) {
+  std::atomic<int> destroyed = 0;
+  base::weak_ref<Counted> weak;
+  {
+    Counted onTheStack(&destroyed);
+    weak.set(&onTheStack);
+  }
+  EXPECT_TRUE(weak.expired());
+}
+
 TEST(WeakRef, SingleThreadedCountClearsWeakReferencesToo) {
   int destroyed = 0;
   base::weak_ref<Local> weak;
@@ -107,11 +118,18 @@ TEST(WeakRef, RacingTheLastReleaseNeverSeesAFreedTarget) {
     base::ref<Counted> a(object);
     base::ref<Counted> b(object);
     base::weak_ref<Counted> early(object);
+    auto dropped = std::make_unique<base::weak_ref<Counted>>(object);
     std::atomic<bool> go = false;
     std::thread reader([&] {
       while (!go) {
       }
       for (int i = 0; i < 50; ++i) early.visit([](Counted* target) { return target ? target->refCount() : -1; });
+    });
+    // A holder that goes while the target dies unlinks or finds itself cleared, never both.
+    std::thread holder([&] {
+      while (!go) {
+      }
+      dropped.reset();
     });
     std::thread dropA([&] {
       while (!go) {
@@ -125,6 +143,7 @@ TEST(WeakRef, RacingTheLastReleaseNeverSeesAFreedTarget) {
     });
     go = true;
     reader.join();
+    holder.join();
     dropA.join();
     dropB.join();
     EXPECT_EQ(destroyed, 1);

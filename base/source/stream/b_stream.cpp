@@ -46,11 +46,16 @@ void copyRest(Stream& from, Stream& to, const char* function, const char* interf
   }
   base::vector<std::uint8_t> buffer(piece);
   std::uint64_t total = 0;
-  for (;;) {
-    const std::uint32_t got = from.worker()->read(buffer.data(), static_cast<std::uint32_t>(piece));
-    to.write(buffer.data(), got);
-    total += got;
-    if (got < piece) break;
+  try {
+    for (;;) {
+      const std::uint32_t got = from.worker()->read(buffer.data(), static_cast<std::uint32_t>(piece));
+      to.write(buffer.data(), got);
+      total += got;
+      if (got < piece) break;
+    }
+  } catch (...) {
+    if (canPosition) from.setPosition(start, seekBegin);
+    throw;
   }
   if ((from.flags & throwOnShortRead) && expected >= 0 && total < static_cast<std::uint64_t>(expected)) {
     throwShortRead(from, static_cast<std::uint64_t>(expected), total);
@@ -192,7 +197,7 @@ Stream Stream::clone() const {
   Stream copy = m_worker->reopen();
   copy.tag = tag;
   copy.flags = flags;
-  if (Hash* hasher = m_worker->hasher(); hasher && copy.worker() != m_worker) {
+  if (Hash* hasher = m_worker->hasher(); hasher && copy && copy.worker() != m_worker) {
     std::unique_ptr<Hash> fresh = hasher->clone();
     fresh->reset();
     copy.worker()->setHasher(std::move(fresh));
@@ -219,8 +224,10 @@ bool copyStream(Stream& destination, Stream& source, std::int64_t maximum) {
   std::int64_t left = maximum;
   for (;;) {
     const auto piece = static_cast<std::uint32_t>(maximum > 0 ? std::min<std::int64_t>(left, copyPiece) : copyPiece);
-    // The last piece is short by nature: that is the end of the data, not a failure.
+    // The last piece is short by nature: that is the end of the data, not a failure,
+    // unless a maximum asked for more.
     const std::uint32_t got = source.worker()->read(buffer.data(), piece);
+    if (maximum > 0 && got < piece && (source.flags & throwOnShortRead)) throwShortRead(source, piece, got);
     if (destination.write(buffer.data(), got) < got) return false;
     if (got < copyPiece || source.isEOF()) return true;
     left -= got;

@@ -169,7 +169,7 @@ private:
   std::uint32_t readAround(std::uint8_t* out, std::uint32_t count) {
     const std::int64_t position = getPosition();
     const std::uint32_t got = m_source.read(out, allowed(position, count));
-    const std::uint32_t keep = std::min(historySize, got);
+    const std::uint32_t keep = std::min({historySize, got, m_buffer.size() / 2});
     std::memcpy(m_buffer.data(), out + got - keep, keep);
     m_start = position + got - keep;
     m_cursor = m_filled = keep;

@@ -112,8 +112,11 @@ public:
     if (count == 0) return 0;
     const auto* bytes = static_cast<const std::uint8_t*>(buffer);
     base::append(m_blocks, base::vector<std::uint8_t>(bytes, bytes + count));
+    // Writes append: afterwards the stream stands at its new end.
     m_size += count;
-    m_position += count;
+    m_position = m_size;
+    m_block = m_blocks.size();
+    m_offset = 0;
     return count;
   }
   std::int64_t setPosition(std::int64_t offset, std::uint32_t origin) override {
@@ -165,7 +168,8 @@ public:
   ContainerStreamWorker(Reference data, std::string_view name) : StreamWorker(Writable ? 31 : 13, name), m_data(data) {}
 
   std::uint32_t read(void* buffer, std::uint32_t count) override {
-    const auto n = static_cast<std::uint32_t>(std::min<std::int64_t>(count, size() - m_position));
+    // The caller may have shrunk the container behind the stream's back.
+    const auto n = static_cast<std::uint32_t>(std::clamp<std::int64_t>(size() - m_position, 0, count));
     if (n) std::memcpy(buffer, m_data.data() + m_position, n);
     m_position += n;
     return n;
@@ -220,6 +224,7 @@ Stream memStream(const void* data, std::int64_t size, std::string_view name) {
 Stream memStream(Stream& source) {
   const std::int64_t left =
       source.has(capSize) ? source.getSize() - (source.has(capPosition) ? source.getPosition() : 0) : 0;
+  if (left <= 0 && source.has(capSize)) return memStream(0);
   if (left <= 0) {
     // A source without a size is copied until its end.
     Stream stream = memStream(0);

@@ -15,7 +15,7 @@ public:
         m_parent(parent),
         m_offset(offset),
         m_length(length) {
-    if (m_parent.has(capPosition)) m_parent.setPosition(m_offset, seekBegin);
+    m_parent.setPosition(m_offset, seekBegin);
   }
 
   const std::uint8_t* getMemory(std::int64_t* offset, std::int64_t* size) override {
@@ -56,13 +56,16 @@ private:
 }  // namespace
 
 Stream subStream(const Stream& parent, std::int64_t offset, std::int64_t length, std::string_view name) {
+  // The window reads at the parent's position, so the parent must be able to move there.
+  if (!parent.has(capPosition)) raise<unsupported_interface>("base::subStream", "Stream::setPosition");
+  offset = std::max<std::int64_t>(offset, 0);
   std::int64_t window = std::max<std::int64_t>(length, 0);
   if (parent.has(capSize)) {
     const std::int64_t parentSize = parent.getSize();
     if (offset > parentSize) raise<exception>("base::subStream", "empty substream of '" + parent.name() + "'!");
     window = std::min(window, parentSize - offset);
   }
-  Stream stream = Stream::adopt(new SubStreamWorker(parent, std::max<std::int64_t>(offset, 0), window, name));
+  Stream stream = Stream::adopt(new SubStreamWorker(parent, offset, window, name));
   stream.tag = parent.tag;
   return stream;
 }

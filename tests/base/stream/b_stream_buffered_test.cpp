@@ -87,6 +87,15 @@ TEST(BufReadStream, PositionsCountFromTheSourcePositionAndFarSeeksMoveIt) {
   EXPECT_EQ(buffered.setPosition(5000), 900);
 }
 
+TEST(BufReadStream, TinyBufferServesLargeAndSmallReads) {
+  const std::string data = pattern(200);
+  base::Stream buffered = base::bufReadStream(fileLikeStream(data), 0, 16);
+  std::string big(100, '\0');
+  ASSERT_EQ(buffered.read(big.data(), 100), 100u);
+  EXPECT_EQ(buffered.setPosition(-3, base::seekCurrent), 97);
+  EXPECT_EQ(big + readAll(buffered).substr(3), data);
+}
+
 TEST(BufReadStream, LengthLimitsTheView) {
   base::Stream buffered = base::bufReadStream(fileLikeStream("0123456789"), 4, 64);
   EXPECT_EQ(buffered.getSize(), 4);

@@ -77,6 +77,10 @@ TEST(MemStream, FromASourceTakesWhatIsLeft) {
   base::Stream copy = base::memStream(source);
   EXPECT_EQ(readAll(copy), "3456789");
 
+  base::Stream atItsEnd = base::memStream("abc", 3);
+  atItsEnd.setPosition(0, base::seekEnd);
+  EXPECT_EQ(base::memStream(atItsEnd).getSize(), 0);
+
   base::Stream unsized = fileLikeStream("stream without a size", base::capRead);
   base::Stream whole = base::memStream(unsized);
   EXPECT_EQ(readAll(whole), "stream without a size");
@@ -89,12 +93,19 @@ TEST(MemBlockStream, EachWriteAppendsAndReadsCrossBlocks) {
   stream.write("f", 1);
   EXPECT_EQ(stream.getSize(), 6);
   EXPECT_EQ(stream.getPosition(), 6);
+  char nothing[1];
+  EXPECT_EQ(stream.read(nothing, 1), 0u);
+  // A write after a seek still appends, and leaves the stream at the end.
+  stream.setPosition(2);
+  stream.write("g", 1);
+  EXPECT_EQ(stream.getPosition(), 7);
+  EXPECT_EQ(stream.read(nothing, 1), 0u);
   EXPECT_EQ(stream.setPosition(1), 1);
   char buffer[8] = {};
   EXPECT_EQ(stream.read(buffer, 4), 4u);
   EXPECT_EQ(std::string(buffer, 4), "bcde");
   EXPECT_EQ(stream.setPosition(-10, base::seekCurrent), 0);
-  EXPECT_EQ(readAll(stream), "abcdef");
+  EXPECT_EQ(readAll(stream), "abcdefg");
 }
 
 TEST(MemBlockStream, OnlyTruncationToZeroIsAResize) {

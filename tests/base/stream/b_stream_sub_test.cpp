@@ -20,6 +20,13 @@ TEST(SubStream, OffsetBeyondTheParentThrowsWithTheParentsName) {
   }
 }
 
+TEST(SubStream, NeedsAParentThatPositionsAndClampsNegativeOffsets) {
+  EXPECT_THROW(base::subStream(fileLikeStream("abc", base::capRead), 1, 1), base::unsupported_interface);
+  base::Stream window = base::subStream(base::memStream("abcd", 4), -3, 2);
+  EXPECT_EQ(window.getSize(), 2);
+  EXPECT_EQ(readAll(window), "ab");
+}
+
 TEST(SubStream, WindowIsCutAtTheParentsEnd) {
   base::Stream parent = base::memStream("abcd", 4, "parent");
   parent.tag = 1;

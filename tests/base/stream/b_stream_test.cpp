@@ -108,6 +108,12 @@ TEST(CopyStream, InMemoryAndPiecewisePathsHonourTheMaximum) {
 
   base::Stream full = base::memStream("ab", 2, "full");
   EXPECT_FALSE(base::copyStream(full, again));
+
+  // Asking for more than the source holds is a short read when the source says so.
+  base::Stream shortSource = fileLikeStream("12345");
+  shortSource.flags |= base::throwOnShortRead;
+  base::Stream sink = base::memStream(0);
+  EXPECT_THROW(base::copyStream(sink, shortSource, 10), base::exception);
 }
 
 TEST(ReadLines, SplitsAtLineBreaksAndSkipsBlankRuns) {
