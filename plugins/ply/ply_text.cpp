@@ -97,12 +97,12 @@ std::string_view WordReader::read(ByteWindow& window) {
     return {reinterpret_cast<const char*>(begin), static_cast<std::size_t>(stop - begin)};
   }
   // The word may go on past the window: copy it out while refilling.
-  std::size_t length = 0;
+  m_copy.clear();
   for (int c = window.peek(); c >= 0 && wordBytes[static_cast<std::size_t>(c)]; c = window.peek()) {
-    if (length < maxWord) m_copy[length++] = static_cast<char>(c);
+    m_copy.push_back(static_cast<char>(c));
     window.advance(1);
   }
-  return {m_copy.data(), length};
+  return m_copy;
 }
 
 Value parseAsciiValue(std::string_view word, DataType type) {

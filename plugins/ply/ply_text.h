@@ -33,12 +33,11 @@ void skipLine(ByteWindow& window);
 class WordReader {
 public:
   /// Skips blanks, then takes word bytes. Empty when the next byte is no word byte or the
-  /// data ends. Words longer than 1024 bytes are consumed whole but cut in what is returned.
+  /// data ends. A word is always returned whole, wherever it lies in the data.
   std::string_view read(ByteWindow& window);
 
 private:
-  static constexpr std::size_t maxWord = 1024;
-  std::array<char, maxWord> m_copy{};
+  base::string m_copy;
 };
 
 /// The value of an ASCII word read as `type`: integers from their leading digits after an

@@ -63,6 +63,30 @@ TEST(PlyAscii, FloatsAreRoundedOnceToTheNearestFloat) {
   EXPECT_EQ(r.recorder.instances[2], "inf 0");
 }
 
+TEST(PlyAscii, LongWordsReadTheSameWhereverTheyLie) {
+  const std::string word = std::string(1100, '0') + "7";
+  std::string body;
+  // Enough words before the last one that it crosses the window's first refill.
+  while (body.size() < 0x40000 - 500) body += word + "\n";
+  const std::size_t count = body.size() / (word.size() + 1) + 1;
+  const std::string file = asciiFile("property int x\n", count, body + word);
+  for (bool inMemory : {true, false}) {
+    const Read r = read(file, inMemory);
+    ASSERT_EQ(r.result, ply::ReadResult::complete);
+    EXPECT_TRUE(std::all_of(r.recorder.instances.begin(), r.recorder.instances.end(),
+                            [](const std::string& value) { return value == "7"; }));
+  }
+}
+
+TEST(PlyAscii, ListCountsOfRealTypesStayBounded) {
+  const Read r = read("ply\nformat ascii 1.0\nelement face 4\nproperty list float int vertex_indices\nend_header\n"
+                      "nan 1\n-inf 2\n2.9 3 4\n1e30 5 6\n");
+  // NaN and -inf count as 0 (their words then read as the next counts); 1e30 asks for more
+  // items than there are.
+  EXPECT_EQ(r.result, ply::ReadResult::bodyEndedEarly);
+  EXPECT_EQ(r.recorder.instances.front(), "{}");
+}
+
 TEST(PlyAscii, IntegerWords) {
   const Read r = read(asciiFile("property uchar a\nproperty char b\nproperty char c\nproperty uint d\nproperty int e\n",
                                 1, "-1 -1 300 +5 +5\n"));

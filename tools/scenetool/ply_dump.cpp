@@ -34,7 +34,11 @@ std::string valueText(const ply::Value& value, ply::DataType type) {
 }
 
 PlyJsonDump::PlyJsonDump(std::FILE* out, const ply::Header& header, bool values)
-    : m_stream(out, m_buffer, sizeof m_buffer), m_writer(m_stream), m_values(values), m_header(header) {}
+    : m_stream(out, m_buffer, sizeof m_buffer),
+      m_writer(m_stream),
+      m_instanceWriter(m_instance),
+      m_values(values),
+      m_header(header) {}
 
 void PlyJsonDump::begin() {
   if (m_begun) return;
@@ -52,6 +56,7 @@ bool PlyJsonDump::plyElement(const ply::Element& element) {
   begin();
   writeElementHead(element);
   ++m_announced;
+  m_expected = element.properties.size();
   if (m_values) {
     m_writer.Key("instances");
     m_writer.StartArray();
@@ -93,31 +98,42 @@ void PlyJsonDump::writeElementHead(const ply::Element& element) {
 }
 
 void PlyJsonDump::beginInstance(std::uint32_t) {
-  if (m_inInstance) m_writer.EndArray();
-  m_writer.StartArray();
+  flushInstance();
+  m_instance.Clear();
+  m_instanceWriter.Reset(m_instance);
+  m_instanceWriter.StartArray();
+  m_entries = 0;
   m_inInstance = true;
+}
+
+void PlyJsonDump::flushInstance() {
+  if (m_inInstance && m_entries == m_expected) {
+    m_instanceWriter.EndArray();
+    m_writer.RawValue(m_instance.GetString(), m_instance.GetSize(), rapidjson::kArrayType);
+  }
+  m_inInstance = false;
 }
 
 void PlyJsonDump::writeValue(const ply::Value& value, ply::DataType type) {
   const std::string text = valueText(value, type);
   if (isReal(type) && (text.back() == 'N' || text.back() == 'y')) {
-    m_writer.String(text.c_str(), static_cast<rapidjson::SizeType>(text.size()));
+    m_instanceWriter.String(text.c_str(), static_cast<rapidjson::SizeType>(text.size()));
   } else {
-    m_writer.RawValue(text.c_str(), text.size(), rapidjson::kNumberType);
+    m_instanceWriter.RawValue(text.c_str(), text.size(), rapidjson::kNumberType);
   }
 }
 
 void PlyJsonDump::plyProperty(const ply::Element&, const ply::Property& property, const ply::ValueArray& values) {
+  ++m_entries;
   if (!property.isList) return writeValue(values[0], property.type);
-  m_writer.StartArray();
+  m_instanceWriter.StartArray();
   for (const ply::Value& value : values) writeValue(value, property.type);
-  m_writer.EndArray();
+  m_instanceWriter.EndArray();
 }
 
 void PlyJsonDump::closeElement() {
   if (m_announced == 0) return;
-  if (m_inInstance) m_writer.EndArray();
-  m_inInstance = false;
+  flushInstance();
   if (m_values) m_writer.EndArray();
   m_writer.EndObject();
 }
@@ -164,15 +180,18 @@ bool PlyTextDump::plyElement(const ply::Element& element) {
   begin();
   writeElementHead(element);
   ++m_announced;
+  m_expected = element.properties.size();
   return m_values;
 }
 
 void PlyTextDump::beginInstance(std::uint32_t index) {
   endLine();
   m_line = fmt::format("  [{}]", index);
+  m_entries = 0;
 }
 
 void PlyTextDump::plyProperty(const ply::Element&, const ply::Property& property, const ply::ValueArray& values) {
+  ++m_entries;
   if (!property.isList) {
     m_line += ' ';
     m_line += valueText(values[0], property.type);
@@ -187,8 +206,8 @@ void PlyTextDump::plyProperty(const ply::Element&, const ply::Property& property
 }
 
 void PlyTextDump::endLine() {
-  if (m_line.empty()) return;
-  fmt::print(m_out, "{}\n", m_line);
+  // An instance that the data cut short is left out, as in the JSON form.
+  if (!m_line.empty() && m_entries == m_expected) fmt::print(m_out, "{}\n", m_line);
   m_line.clear();
 }
 

@@ -3,6 +3,7 @@
 #include "ply_parser.h"
 
 #include <rapidjson/filewritestream.h>
+#include <rapidjson/stringbuffer.h>
 #include <rapidjson/writer.h>
 
 #include <cstdio>
@@ -12,7 +13,8 @@ namespace scenetool {
 
 /// Writes a PLY file's header model, and with values every property instance as read, as
 /// the JSON document of `scenetool ply --json`. It is a body receiver: the document is
-/// written while the file is read, so a large file is never held twice.
+/// written while the file is read, so a large file is never held twice. Each instance is
+/// held until it is complete; one that the data cut short is left out.
 class PlyJsonDump {
 public:
   /// `header` is the model that the parse fills; it is read when the body begins.
@@ -31,11 +33,16 @@ private:
   void begin();
   void writeElementHead(const ply::Element& element);
   void writeValue(const ply::Value& value, ply::DataType type);
+  void flushInstance();
   void closeElement();
 
   char m_buffer[1 << 16];
   rapidjson::FileWriteStream m_stream;
   rapidjson::Writer<rapidjson::FileWriteStream> m_writer;
+  rapidjson::StringBuffer m_instance;
+  rapidjson::Writer<rapidjson::StringBuffer> m_instanceWriter;
+  std::size_t m_entries = 0;
+  std::size_t m_expected = 0;
   bool m_values;
   bool m_begun = false;
   bool m_inInstance = false;
@@ -44,7 +51,7 @@ private:
 };
 
 /// The same as readable text: format, elements with counts, properties with types, and with
-/// values one line per instance.
+/// values one line per complete instance.
 class PlyTextDump {
 public:
   PlyTextDump(std::FILE* out, const ply::Header& header, bool values)
@@ -65,6 +72,8 @@ private:
   bool m_values;
   bool m_begun = false;
   std::string m_line;
+  std::size_t m_entries = 0;
+  std::size_t m_expected = 0;
   std::size_t m_announced = 0;
 };
 
