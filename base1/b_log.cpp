@@ -1,12 +1,13 @@
 #include "b_log.h"
 
+#include "b_platform.h"
+
 #include <algorithm>
 #include <cerrno>
 #include <chrono>
 #include <ctime>
 
 #include <fmt/chrono.h>
-#include <cstring>
 
 namespace base {
 
@@ -25,31 +26,48 @@ Log::~Log() {
 
 std::string levelText(int level) {
   switch (level) {
-    case logError: return "error";
-    case logWarning: return "warning";
-    case logInfo: return "info";
-    case logDebug: return "debug";
-    default: return fmt::format("level {}", level);
+    case logError:
+      return "error";
+    case logWarning:
+      return "warning";
+    case logInfo:
+      return "info";
+    case logDebug:
+      return "debug";
+    default:
+      return fmt::format("level {}", level);
   }
 }
 
+namespace {
+// How deep this thread is inside sinks. A sink may log: its message reaches the sinks again,
+// but only a few levels deep, so a sink that always logs cannot recurse without end.
+thread_local int sinkDepth = 0;
+constexpr int maxSinkDepth = 4;
+
+struct SinkDepth {
+  SinkDepth() { ++sinkDepth; }
+  ~SinkDepth() { --sinkDepth; }
+};
+}  // namespace
+
 void Log::write(name_id category, int level, std::string_view text) {
+  // Recursive, so that a sink may log or add and remove sinks; held while the sinks run, so
+  // that a sink is never called after removeSink returned.
   std::lock_guard lock(m_mutex);
   if (m_stderr) {
     fmt::print(stderr, "{}: {}\n", levelText(level), text);
   }
   if (m_file) {
-    const auto now = std::chrono::system_clock::to_time_t(std::chrono::system_clock::now());
-    std::tm local{};
-#if defined(_WIN32)
-    localtime_s(&local, &now);
-#else
-    localtime_r(&now, &local);
-#endif
+    const std::tm local = platform::localTime(std::chrono::system_clock::to_time_t(std::chrono::system_clock::now()));
     fmt::print(m_file, "{:%Y-%m-%d %H:%M:%S} {} [{}] {}\n", local, levelText(level), base::text(category), text);
     std::fflush(m_file);
   }
-  for (LogSink* sink : m_sinks) sink->write(category, level, text);
+  if (sinkDepth >= maxSinkDepth) return;
+  const SinkDepth depth;
+  // A copy, since a sink may change the list while it runs.
+  const std::vector<LogSink*> sinks = m_sinks;
+  for (LogSink* sink : sinks) sink->write(category, level, text);
 }
 
 void Log::setStderr(bool enabled) {
@@ -62,7 +80,7 @@ bool Log::setFile(const std::string& path, std::string& error) {
   if (!path.empty()) {
     file = std::fopen(path.c_str(), "a");
     if (!file) {
-      error = std::strerror(errno);
+      error = platform::systemErrorText(static_cast<std::uint32_t>(errno));
       return false;
     }
   }
@@ -80,6 +98,16 @@ void Log::addSink(LogSink* sink) {
 void Log::removeSink(LogSink* sink) {
   std::lock_guard lock(m_mutex);
   m_sinks.erase(std::remove(m_sinks.begin(), m_sinks.end(), sink), m_sinks.end());
+}
+
+std::string clipped(std::string_view text, std::size_t limit) {
+  if (text.size() <= limit) return std::string(text);
+  std::size_t cut = limit;
+  // Never end inside a UTF-8 sequence: back off over its continuation bytes.
+  while (cut > 0 && (static_cast<unsigned char>(text[cut]) & 0xC0) == 0x80) --cut;
+  std::string result(text.substr(0, cut));
+  result += "...";
+  return result;
 }
 
 Log& log() {

@@ -6,6 +6,7 @@
 #include "b_containers.h"
 
 #include <cstdint>
+#include <ctime>
 
 namespace base::platform {
 
@@ -14,6 +15,9 @@ base::string captureStack(int skip);
 
 /// The system's text for an error code as the system gives it; empty for an unknown code.
 base::string systemErrorText(std::uint32_t code);
+
+/// The local calendar time of `time`; thread-safe.
+std::tm localTime(std::time_t time);
 
 /// Lets another thread run.
 void yieldThread();

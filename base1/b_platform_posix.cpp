@@ -32,10 +32,14 @@ base::string captureStack(int skip) {
   return text;
 }
 
+std::tm localTime(std::time_t time) {
+  std::tm local{};
+  localtime_r(&time, &local);
+  return local;
+}
+
 void yieldThread() { sched_yield(); }
 
-void sleepMilliseconds(unsigned milliseconds) {
-  std::this_thread::sleep_for(std::chrono::milliseconds(milliseconds));
-}
+void sleepMilliseconds(unsigned milliseconds) { std::this_thread::sleep_for(std::chrono::milliseconds(milliseconds)); }
 
 }  // namespace base::platform

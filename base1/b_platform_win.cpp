@@ -37,6 +37,12 @@ base::string captureStack(int skip) {
   return text;
 }
 
+std::tm localTime(std::time_t time) {
+  std::tm local{};
+  localtime_s(&local, &time);
+  return local;
+}
+
 void yieldThread() { SwitchToThread(); }
 
 void sleepMilliseconds(unsigned milliseconds) { Sleep(milliseconds); }

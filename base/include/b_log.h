@@ -26,7 +26,7 @@ enum LogLevel : int { logError = 2, logWarning = 3, logInfo = 4, logDebug = 5 };
 
 /// A destination for finished log messages (a test's capture, a window, ...).
 class BASE1_API LogSink {
-public:
+ public:
   virtual ~LogSink();
   virtual void write(name_id category, int level, std::string_view text) = 0;
 };
@@ -34,7 +34,7 @@ public:
 /// The log: a current level and the sinks that finished messages go to. Standard error is
 /// a sink by default; a file sink can be added. Thread-safe.
 class BASE1_API Log {
-public:
+ public:
   Log();
   virtual ~Log();
   Log(const Log&) = delete;
@@ -46,8 +46,8 @@ public:
   /// Formats and writes a message unless its level is above the current one or its format is
   /// empty; both are tested before any formatting.
   template <class... Args>
-    requires(sizeof...(Args) > 0)
-  void message(name_id category, int level, fmt::format_string<Args...> format, Args&&... args) {
+  requires(sizeof...(Args) > 0) void message(name_id category, int level, fmt::format_string<Args...> format,
+                                             Args&&... args) {
     const fmt::string_view text = format;
     if (level > m_level.load(std::memory_order_relaxed) || text.size() == 0) return;
     write(category, level, fmt::format(format, std::forward<Args>(args)...));
@@ -74,16 +74,20 @@ public:
   void addSink(LogSink* sink);
   void removeSink(LogSink* sink);
 
-private:
+ private:
   std::atomic<int> m_level{logWarning};
   bool m_stderr = true;
   std::FILE* m_file = nullptr;
   std::vector<LogSink*> m_sinks;
-  std::mutex m_mutex;
+  std::recursive_mutex m_mutex;
 };
 
 /// The process-wide log; callers never own it.
 BASE1_API Log& log();
+
+/// `text` as a message may quote it: words from a file are cut to `limit` bytes (never
+/// inside a UTF-8 sequence) and marked with "...", so a hostile word cannot flood the log.
+BASE1_API std::string clipped(std::string_view text, std::size_t limit = 80);
 
 /// The text of a level: "error", "warning", "info", "debug" (others: "level N").
 BASE1_API std::string levelText(int level);

@@ -79,7 +79,14 @@ zlib_exception::zlib_exception(std::string_view message, const char* file, const
                                int zlibCode)
     : exception(message, file, function, line), m_zlibCode(zlibCode) {}
 
-void zlib_exception::report(Log& log) const { reportWithDetail(log, "zlib| ", orNull(zError(m_zlibCode))); }
+void zlib_exception::report(Log& log) const {
+  // zError indexes a table without a bounds check: only the codes zlib defines may reach it.
+  if (m_zlibCode < Z_VERSION_ERROR || m_zlibCode > Z_NEED_DICT) {
+    reportWithDetail(log, "zlib| ", fmt::format("unknown zlib error {}", m_zlibCode));
+    return;
+  }
+  reportWithDetail(log, "zlib| ", orNull(zError(m_zlibCode)));
+}
 
 namespace fs {
 file_not_found::file_not_found(std::string_view message, const char* file, const char* function, unsigned line,

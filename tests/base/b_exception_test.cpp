@@ -100,10 +100,21 @@ TEST(ExceptionReport, DetailFormats) {
   base::invalid_argument("a.cpp", nullptr, 5, "size").report(base::log());
   base::zlib_exception("inflate", "z.cpp", "inflateBlock", 9, Z_DATA_ERROR).report(base::log());
   EXPECT_EQ(capture.texts(),
-            (std::vector<std::string>{
-                "Unsupported interface.(Stream::read->write)\n    File: b_stream (103)\nFunction: base::Stream::operator >>\n",
-                "Invalid argument(size)\n    File: a.cpp (5)\nFunction: (null)\n",
-                "zlib| inflate(data error)\n    File: z.cpp (9)\nFunction: inflateBlock\n"}));
+            (std::vector<std::string>{"Unsupported interface.(Stream::read->write)\n    File: b_stream "
+                                      "(103)\nFunction: base::Stream::operator >>\n",
+                                      "Invalid argument(size)\n    File: a.cpp (5)\nFunction: (null)\n",
+                                      "zlib| inflate(data error)\n    File: z.cpp (9)\nFunction: inflateBlock\n"}));
+}
+
+TEST(ExceptionReport, ZlibCodesOutsideZlibsTableGetAFixedText) {
+  base::NoStackCapture noStack;
+  LogCapture capture;
+  for (int code : {3, -7, -1000}) base::zlib_exception("inflate", "z.cpp", "f", 1, code).report(base::log());
+  base::zlib_exception("inflate", "z.cpp", "f", 1, Z_NEED_DICT).report(base::log());
+  ASSERT_EQ(capture.entries.size(), 4u);
+  EXPECT_EQ(capture.texts()[0].substr(0, 35), "zlib| inflate(unknown zlib error 3)");
+  EXPECT_NE(capture.texts()[2].find("unknown zlib error -1000"), std::string::npos);
+  EXPECT_NE(capture.texts()[3].find("(need dictionary)"), std::string::npos);
 }
 
 TEST(ExceptionReport, FilteredWhenTheLogIsBelowErrors) {

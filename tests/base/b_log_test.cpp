@@ -80,6 +80,38 @@ TEST(Log, FileSinkAppendsLevelCategoryAndText) {
   EXPECT_NE(content.str().find("warning [io] stream 'a.ply' is short\n"), std::string::npos) << content.str();
 }
 
+// A sink that logs while it writes: before the fix this deadlocked on the log's own lock.
+struct EchoingSink : base::LogSink {
+  int calls = 0;
+  void write(base::name_id, int, std::string_view text) override {
+    ++calls;
+    base::log().message(base::logIO, base::logError, "echo of {}", text);
+  }
+};
+
+TEST(Log, SinkThatLogsNeitherDeadlocksNorRecursesForever) {
+  LogCapture capture;
+  EchoingSink echo;
+  base::log().addSink(&echo);
+  base::log().message(base::logIO, base::logError, "first");
+  base::log().removeSink(&echo);
+  EXPECT_GT(echo.calls, 1);
+  EXPECT_LT(echo.calls, 10);
+  ASSERT_FALSE(capture.entries.empty());
+  EXPECT_EQ(capture.entries.front().text, "first");
+  EXPECT_EQ(capture.entries[1].text, "echo of first");
+}
+
+TEST(Log, ClippedCutsLongWordsOnly) {
+  EXPECT_EQ(base::clipped("vertex"), "vertex");
+  EXPECT_EQ(base::clipped(std::string(80, 'a')), std::string(80, 'a'));
+  EXPECT_EQ(base::clipped(std::string(50'000'000, 'a')), std::string(80, 'a') + "...");
+  // Two-byte characters: the cut backs off to the start of the sequence it would split.
+  std::string accents;
+  for (int i = 0; i < 50; ++i) accents += "\xC3\xA9";
+  EXPECT_EQ(base::clipped(accents, 5), "\xC3\xA9\xC3\xA9...");
+}
+
 TEST(Log, FileSinkThatCannotOpenSaysWhy) {
   std::string error;
   EXPECT_FALSE(base::log().setFile("/nonexistent-dir/x/log.txt", error));

@@ -16,7 +16,7 @@ constexpr std::uint32_t copyPiece = 0x40000;
 // The null stream: swallows writes, answers reads with the full count and is always at
 // its end.
 class NullStreamWorker final : public StreamWorker {
-public:
+ public:
   NullStreamWorker() : StreamWorker(799, "null") {}
   std::uint32_t read(void*, std::uint32_t count) override { return count; }
   std::uint32_t write(const void*, std::uint32_t count) override { return count; }
@@ -61,6 +61,27 @@ void copyRest(Stream& from, Stream& to, const char* function, const char* interf
     throwShortRead(from, static_cast<std::uint64_t>(expected), total);
   }
   if (canPosition) from.setPosition(start, seekBegin);
+}
+
+// An in-memory source is written from its block without a copy, from its current position
+// on, like any other source, and is left after the last byte copied.
+bool copyFromMemory(Stream& destination, Stream& source, std::int64_t maximum) {
+  std::int64_t offset = 0;
+  std::int64_t size = 0;
+  const std::uint8_t* data = source.worker()->getMemory(&offset, &size);
+  const std::int64_t start = source.has(capPosition) ? std::clamp<std::int64_t>(source.getPosition(), 0, size) : 0;
+  std::int64_t count = size - start;
+  if (maximum > 0) count = std::min(count, maximum);
+  std::int64_t done = 0;
+  // Writes take 32-bit counts: larger blocks go in as few calls as that allows.
+  while (done < count) {
+    const auto piece = static_cast<std::uint32_t>(std::min<std::int64_t>(count - done, 0x80000000));
+    const std::uint32_t written = destination.write(data + offset + start + done, piece);
+    done += written;
+    if (written < piece) break;
+  }
+  if (source.has(capPosition)) source.setPosition(start + done, seekBegin);
+  return done == count;
 }
 
 }  // namespace
@@ -207,19 +228,7 @@ Stream Stream::clone() const {
 
 bool copyStream(Stream& destination, Stream& source, std::int64_t maximum) {
   if (!source.has(capRead)) return false;
-  if (source.has(capInMemory)) {
-    std::int64_t offset = 0;
-    std::int64_t size = 0;
-    const std::uint8_t* data = source.worker()->getMemory(&offset, &size);
-    if (maximum > 0) size = std::min(size, maximum);
-    // Writes take 32-bit counts: larger blocks go in as few calls as that allows.
-    for (std::int64_t done = 0; done < size;) {
-      const auto piece = static_cast<std::uint32_t>(std::min<std::int64_t>(size - done, 0x80000000));
-      if (destination.write(data + offset + done, piece) < piece) return false;
-      done += piece;
-    }
-    return true;
-  }
+  if (source.has(capInMemory)) return copyFromMemory(destination, source, maximum);
   base::vector<std::uint8_t> buffer(copyPiece);
   std::int64_t left = maximum;
   for (;;) {
@@ -239,7 +248,9 @@ void readLines(Stream& stream, base::vector<base::string>& lines) {
   if (!stream.has(capRead)) return;
   base::vector<std::uint8_t> buffer(copyPiece);
   base::string line;
-  auto isBlank = [](std::uint8_t c) { return c == ' ' || c == '\t' || c == '\r' || c == '\n' || c == '\v' || c == '\f'; };
+  auto isBlank = [](std::uint8_t c) {
+    return c == ' ' || c == '\t' || c == '\r' || c == '\n' || c == '\v' || c == '\f';
+  };
   for (;;) {
     const std::uint32_t got = stream.worker()->read(buffer.data(), copyPiece);
     for (std::uint32_t i = 0; i < got; ++i) {

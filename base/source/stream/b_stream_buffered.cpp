@@ -17,7 +17,7 @@ constexpr std::uint32_t historySize = 64;
 
 // A 16-byte aligned block from the host allocator.
 class AlignedBuffer {
-public:
+ public:
   explicit AlignedBuffer(std::uint32_t size)
       : m_data(static_cast<std::uint8_t*>(
             StdAlignAllocPolicy<16>::allocateBytes(size, __FILE__, __LINE__, "base::AlignedBuffer"))),
@@ -34,7 +34,7 @@ public:
     m_size = 0;
   }
 
-private:
+ private:
   std::uint8_t* m_data;
   std::uint32_t m_size;
 };
@@ -42,7 +42,7 @@ private:
 // Common to both directions: the source handle with its flags cleared, so that it never
 // throws inside the buffer, and the original tag and flags for getSource.
 class BufferedWorker : public StreamWorker {
-public:
+ public:
   BufferedWorker(std::uint32_t capabilities, const Stream& source, std::uint32_t bufferSize, std::string_view name)
       : StreamWorker(capabilities, name.empty() ? std::string_view(source.name()) : name),
         m_source(source),
@@ -59,7 +59,7 @@ public:
     return source;
   }
 
-protected:
+ protected:
   Stream m_source;
   std::uint64_t m_sourceTag;
   std::uint32_t m_sourceFlags;
@@ -69,7 +69,7 @@ protected:
 // Buffered reading; positions count from where the source stood at creation. The buffer
 // holds the source bytes [m_start, m_start + m_filled); m_cursor is the read position in it.
 class BufReadWorker final : public BufferedWorker {
-public:
+ public:
   BufReadWorker(std::uint32_t capabilities, const Stream& source, std::int64_t length, std::uint32_t bufferSize,
                 std::string_view name, bool byteWise)
       : BufferedWorker(capabilities, source, bufferSize, name),
@@ -108,13 +108,17 @@ public:
   std::int64_t setPosition(std::int64_t offset, std::uint32_t origin) override {
     std::int64_t target = offset;
     switch (origin) {
-      case seekBegin: break;
-      case seekCurrent: target += getPosition(); break;
+      case seekBegin:
+        break;
+      case seekCurrent:
+        target += getPosition();
+        break;
       case seekEnd:
         if (!m_source.has(capSize)) raise<unsupported_interface>("base::bufSetPosition", "Stream::getSize");
         target += getSize();
         break;
-      default: raise<switch_exception>("base::bufSetPosition");
+      default:
+        raise<switch_exception>("base::bufSetPosition");
     }
     target = std::max<std::int64_t>(target, 0);
     if (m_source.has(capSize)) target = std::min(target, getSize());
@@ -146,7 +150,7 @@ public:
     StreamWorker::close();
   }
 
-private:
+ private:
   // How many more bytes the window allows from `position`.
   std::uint32_t allowed(std::int64_t position, std::uint32_t wanted) const {
     if (m_length <= 0) return wanted;
@@ -199,7 +203,7 @@ private:
 
 // Buffered writing: writes collect in the buffer and go to the destination when it is full.
 class BufWriteWorker final : public BufferedWorker {
-public:
+ public:
   using BufferedWorker::BufferedWorker;
 
   std::uint32_t write(const void* buffer, std::uint32_t count) override {
@@ -228,7 +232,8 @@ public:
   }
 
   void close() override {
-    if (m_source && m_pending > 0 && !writePending()) {
+    // Nothing is thrown here (release would only log it): the bytes left are logged instead.
+    if (m_source && drainPending() > 0) {
       log().message(logIO, logError, "stream '{}': {} buffered bytes could not be written", name(), m_pending);
     }
     m_buffer.release();
@@ -236,24 +241,36 @@ public:
     StreamWorker::close();
   }
 
-private:
-  // Writes what is pending; false when the destination took less. What it took is gone
-  // from the buffer either way.
-  bool writePending() {
-    if (m_pending == 0) return true;
-    const std::uint32_t written = writeSource(m_buffer.data(), m_pending);
+ private:
+  // Writes what is pending and removes from the buffer what the destination took; returns
+  // the bytes still pending.
+  std::uint32_t drainPending() {
+    if (m_pending == 0) return 0;
+    const std::uint32_t written = m_source.write(m_buffer.data(), m_pending);
     std::memmove(m_buffer.data(), m_buffer.data() + written, m_pending - written);
     m_pending -= written;
-    return m_pending == 0;
+    return m_pending;
+  }
+
+  // drainPending, then the short write is reported (once the buffer is right, so that a
+  // later flush never writes the same bytes twice). False when bytes are still pending.
+  bool writePending() {
+    const std::uint32_t wanted = m_pending;
+    if (drainPending() == 0) return true;
+    reportShortWrite(wanted, wanted - m_pending);
+    return false;
   }
 
   std::uint32_t writeSource(const std::uint8_t* data, std::uint32_t count) {
     const std::uint32_t written = m_source.write(data, count);
-    if (written < count && (m_sourceFlags & throwOnShortWrite)) {
-      raise<exception>("base::Stream::write", fmt::format("stream '{}': trying to write {} bytes, written {} bytes",
-                                                          m_source.name(), count, written));
-    }
+    if (written < count) reportShortWrite(count, written);
     return written;
+  }
+
+  void reportShortWrite(std::uint32_t count, std::uint32_t written) const {
+    if (!(m_sourceFlags & throwOnShortWrite)) return;
+    raise<exception>("base::Stream::write", fmt::format("stream '{}': trying to write {} bytes, written {} bytes",
+                                                        m_source.name(), count, written));
   }
 
   std::uint32_t m_pending = 0;

@@ -1,5 +1,6 @@
 #include "b_exception.h"
 #include "b_stream.h"
+#include "log_capture.h"
 #include "test_streams.h"
 
 #include <gtest/gtest.h>
@@ -8,8 +9,9 @@
 
 namespace {
 
-using testing_support::FileLikeWorker;
 using testing_support::fileLikeStream;
+using testing_support::FileLikeWorker;
+using testing_support::LogCapture;
 using testing_support::readAll;
 
 std::string pattern(std::size_t size) {
@@ -196,6 +198,37 @@ TEST(BufWriteStream, ShortWriteThrowsWhenTheDestinationAskedForIt) {
   } catch (const base::exception& error) {
     EXPECT_STREQ(error.what(), "stream 'file-like': trying to write 6 bytes, written 1 bytes");
   }
+}
+
+// A destination that takes at most `room` bytes per call.
+struct Trickle : Limited {
+  Trickle(std::uint32_t perCall) : Limited(1000), perCall(perCall) {}
+  std::uint32_t write(const void* data, std::uint32_t count) override {
+    return Limited::write(data, std::min(count, perCall));
+  }
+  std::uint32_t perCall;
+};
+
+TEST(BufWriteStream, BytesTakenBeforeAShortWriteAreNotWrittenAgain) {
+  auto* trickle = new Trickle(2);
+  base::Stream destination = base::Stream::adopt(trickle);
+  destination.flags = base::throwOnShortWrite;
+  base::Stream buffered = base::bufWriteStream(destination, 8);
+  buffered.write("abc", 3);
+  EXPECT_THROW(buffered.worker()->flush(), base::exception);
+  trickle->perCall = 100;
+  buffered.write("def", 3);
+  buffered.worker()->flush();
+  EXPECT_EQ(trickle->written, "abcdef");
+}
+
+TEST(BufWriteStream, CloseLogsTheBytesThatWereLost) {
+  LogCapture capture;
+  {
+    base::Stream buffered = base::bufWriteStream(base::Stream::adopt(new Limited(2)), 8, "out");
+    buffered.write("abcde", 5);
+  }
+  EXPECT_EQ(capture.texts(), std::vector<std::string>{"stream 'out': 3 buffered bytes could not be written"});
 }
 
 }  // namespace

@@ -1,5 +1,5 @@
-#include "b_exception.h"
 #include "b_stream.h"
+#include "b_exception.h"
 #include "log_capture.h"
 #include "test_streams.h"
 
@@ -114,6 +114,26 @@ TEST(CopyStream, InMemoryAndPiecewisePathsHonourTheMaximum) {
   shortSource.flags |= base::throwOnShortRead;
   base::Stream sink = base::memStream(0);
   EXPECT_THROW(base::copyStream(sink, shortSource, 10), base::exception);
+}
+
+TEST(CopyStream, StartsAtTheSourcePositionAndMovesPastWhatItCopied) {
+  for (bool inMemory : {true, false}) {
+    SCOPED_TRACE(inMemory ? "in memory" : "file-like");
+    base::Stream source = inMemory ? base::memStream("abcdef", 6) : fileLikeStream("abcdef");
+    source.setPosition(3);
+    base::string copied;
+    base::Stream target = base::stringStream(copied);
+    EXPECT_TRUE(base::copyStream(target, source));
+    EXPECT_EQ(copied, "def");
+    EXPECT_EQ(source.getPosition(), 6);
+
+    source.setPosition(1);
+    copied.clear();
+    base::Stream limited = base::stringStream(copied);
+    EXPECT_TRUE(base::copyStream(limited, source, 2));
+    EXPECT_EQ(copied, "bc");
+    EXPECT_EQ(source.getPosition(), 3);
+  }
 }
 
 TEST(ReadLines, SplitsAtLineBreaksAndSkipsBlankRuns) {
