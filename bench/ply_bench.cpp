@@ -30,7 +30,7 @@ struct Columns {
 
 // A file read through the stream interface, not in memory: the way an importer reads.
 class FileSource final : public base::StreamWorker {
-public:
+ public:
   explicit FileSource(const std::string& path)
       : StreamWorker(base::capRead | base::capPosition | base::capSize, path), m_file(std::fopen(path.c_str(), "rb")) {
     std::fseek(m_file, 0, SEEK_END);
@@ -49,13 +49,13 @@ public:
   std::int64_t getSize() override { return m_size; }
   bool isEOF() override { return getPosition() >= m_size; }
 
-private:
+ private:
   std::FILE* m_file;
   std::int64_t m_size = 0;
 };
 
 class ColumnReceiver {
-public:
+ public:
   explicit ColumnReceiver(Columns& columns) : m_columns(columns) {}
 
   bool plyElement(const ply::Element& element) {
@@ -74,10 +74,12 @@ public:
       return;
     }
     m_columns.counts.push_back(static_cast<std::uint32_t>(values.size()));
-    for (const ply::Value& value : values) m_columns.items.push_back(value.i);
+    for (const ply::Value& value : values) {
+      m_columns.items.push_back(static_cast<std::int32_t>(value.convertTo<std::int64_t>(property.type)));
+    }
   }
 
-private:
+ private:
   Columns& m_columns;
   std::size_t m_first = 0;
 };
@@ -93,8 +95,7 @@ struct ElementLayout {
 std::vector<ElementLayout> layout(Shape shape) {
   using enum Kind;
   if (shape == Shape::mesh) {
-    return {{1'000'000, {real, real, real, real, real, real, byte, byte, byte, byte, real, real}},
-            {2'000'000, {list}}};
+    return {{1'000'000, {real, real, real, real, real, real, byte, byte, byte, byte, real, real}}, {2'000'000, {list}}};
   }
   return {{2'000'000, {real, real, real, byte, byte, byte}}};
 }
@@ -110,7 +111,8 @@ std::vector<char> readWhole(const std::string& path) {
 
 const char* bodyStart(const std::vector<char>& data) {
   const char* marker = "end_header\n";
-  return std::search(data.data(), data.data() + data.size(), marker, marker + std::strlen(marker)) + std::strlen(marker);
+  return std::search(data.data(), data.data() + data.size(), marker, marker + std::strlen(marker)) +
+         std::strlen(marker);
 }
 
 // Adds the element's columns with room for its values; returns the first one's index.
@@ -136,12 +138,19 @@ void splitBinary(const std::vector<char>& data, Shape shape, Columns& columns) {
     for (std::size_t i = 0; i < element.count; ++i) {
       for (std::size_t p = 0; p < element.kinds.size(); ++p) {
         switch (element.kinds[p]) {
-          case Kind::real: columns.scalars[first + p].push_back(std::bit_cast<float>(load32<Swap>(at))); at += 4; break;
-          case Kind::byte: columns.scalars[first + p].push_back(static_cast<unsigned char>(*at)); at += 1; break;
+          case Kind::real:
+            columns.scalars[first + p].push_back(std::bit_cast<float>(load32<Swap>(at)));
+            at += 4;
+            break;
+          case Kind::byte:
+            columns.scalars[first + p].push_back(static_cast<unsigned char>(*at));
+            at += 1;
+            break;
           case Kind::list: {
             const auto count = static_cast<unsigned char>(*at++);
             columns.counts.push_back(count);
-            for (unsigned k = 0; k < count; ++k, at += 4) columns.items.push_back(static_cast<std::int32_t>(load32<Swap>(at)));
+            for (unsigned k = 0; k < count; ++k, at += 4)
+              columns.items.push_back(static_cast<std::int32_t>(load32<Swap>(at)));
             break;
           }
         }
@@ -153,7 +162,9 @@ void splitBinary(const std::vector<char>& data, Shape shape, Columns& columns) {
 void splitAscii(const std::vector<char>& data, Shape shape, Columns& columns) {
   const char* at = bodyStart(data);
   const char* end = data.data() + data.size();
-  auto skipBlanks = [&] { while (at != end && (*at == ' ' || *at == '\n' || *at == '\r' || *at == '\t')) ++at; };
+  auto skipBlanks = [&] {
+    while (at != end && (*at == ' ' || *at == '\n' || *at == '\r' || *at == '\t')) ++at;
+  };
   auto number = [&](auto& value) {
     skipBlanks();
     at = std::from_chars(at, end, value).ptr;
@@ -216,20 +227,26 @@ void BM_FloorSplit(benchmark::State& state, Shape shape, Encoding encoding) {
     Columns columns;
     const std::vector<char> data = readWhole(path);
     switch (encoding) {
-      case Encoding::ascii: splitAscii(data, shape, columns); break;
-      case Encoding::little: splitBinary<false>(data, shape, columns); break;
-      case Encoding::big: splitBinary<true>(data, shape, columns); break;
+      case Encoding::ascii:
+        splitAscii(data, shape, columns);
+        break;
+      case Encoding::little:
+        splitBinary<false>(data, shape, columns);
+        break;
+      case Encoding::big:
+        splitBinary<true>(data, shape, columns);
+        break;
     }
     benchmark::DoNotOptimize(columns.items.data());
   }
   setRate(state, path);
 }
 
-#define PLY_BENCH(shape, encoding)                                                                              \
+#define PLY_BENCH(shape, encoding)                                                                                     \
   BENCHMARK_CAPTURE(BM_PlyParse, shape##_##encoding, Shape::shape, Encoding::encoding)->Unit(benchmark::kMillisecond); \
-  BENCHMARK_CAPTURE(BM_FloorSplit, shape##_##encoding, Shape::shape, Encoding::encoding)                            \
-      ->Unit(benchmark::kMillisecond);                                                                               \
-  BENCHMARK_CAPTURE(BM_FloorReadFile, shape##_##encoding, Shape::shape, Encoding::encoding)                         \
+  BENCHMARK_CAPTURE(BM_FloorSplit, shape##_##encoding, Shape::shape, Encoding::encoding)                               \
+      ->Unit(benchmark::kMillisecond);                                                                                 \
+  BENCHMARK_CAPTURE(BM_FloorReadFile, shape##_##encoding, Shape::shape, Encoding::encoding)                            \
       ->Unit(benchmark::kMillisecond)
 
 PLY_BENCH(mesh, ascii);

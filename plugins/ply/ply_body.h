@@ -11,6 +11,7 @@
 #include "ply_value.h"
 #include "ply_window.h"
 
+#include <bit>
 #include <cstdint>
 #include <cstring>
 
@@ -21,38 +22,51 @@ bool parseHeader(Header& header, ByteWindow& window, base::Stream& stream);
 /// Logs that the data ended inside `element` after `read` complete instances.
 void warnEndedEarly(const Element& element, std::uint64_t read);
 
-/// One binary value of `type` at `bytes`, byte-swapped when `Swap`.
+inline std::uint16_t swapBytes(std::uint16_t value) { return __builtin_bswap16(value); }
+inline std::uint32_t swapBytes(std::uint32_t value) { return __builtin_bswap32(value); }
+inline std::uint64_t swapBytes(std::uint64_t value) { return __builtin_bswap64(value); }
+
+/// The unsigned integer of sizeof(T) bytes at `bytes`, byte-swapped when `Swap`.
+template <class T, bool Swap>
+inline T load(const std::uint8_t* bytes) {
+  T raw;
+  std::memcpy(&raw, bytes, sizeof raw);
+  if constexpr (Swap) raw = swapBytes(raw);
+  return raw;
+}
+
+/// One binary value of `type` at `bytes`, byte-swapped when `Swap`; the member written is
+/// the one the type reads from.
 template <bool Swap>
 inline Value decodeBinary(const std::uint8_t* bytes, DataType type) {
   Value value;
   switch (type) {
-    case DataType::int8: value.i = static_cast<std::int8_t>(bytes[0]); break;
-    case DataType::uint8: value.u = bytes[0]; break;
+    case DataType::int8:
+      value.i = static_cast<std::int8_t>(bytes[0]);
+      break;
+    case DataType::uint8:
+      value.u = bytes[0];
+      break;
     case DataType::int16:
-    case DataType::uint16: {
-      std::uint16_t raw;
-      std::memcpy(&raw, bytes, 2);
-      if constexpr (Swap) raw = __builtin_bswap16(raw);
-      value.u = type == DataType::int16 ? static_cast<std::uint32_t>(static_cast<std::int16_t>(raw)) : raw;
+      value.i = std::bit_cast<std::int16_t>(load<std::uint16_t, Swap>(bytes));
       break;
-    }
+    case DataType::uint16:
+      value.u = load<std::uint16_t, Swap>(bytes);
+      break;
     case DataType::int32:
+      value.i = std::bit_cast<std::int32_t>(load<std::uint32_t, Swap>(bytes));
+      break;
     case DataType::uint32:
-    case DataType::float32: {
-      std::uint32_t raw;
-      std::memcpy(&raw, bytes, 4);
-      if constexpr (Swap) raw = __builtin_bswap32(raw);
-      value.u = raw;
+      value.u = load<std::uint32_t, Swap>(bytes);
       break;
-    }
-    case DataType::float64: {
-      std::uint64_t raw;
-      std::memcpy(&raw, bytes, 8);
-      if constexpr (Swap) raw = __builtin_bswap64(raw);
-      std::memcpy(&value.d, &raw, 8);
+    case DataType::float32:
+      value.f = std::bit_cast<float>(load<std::uint32_t, Swap>(bytes));
       break;
-    }
-    default: base::raise<base::switch_exception>("ply::PropertyInstance::parseValue");
+    case DataType::float64:
+      value.d = std::bit_cast<double>(load<std::uint64_t, Swap>(bytes));
+      break;
+    default:
+      base::raise<base::switch_exception>("ply::PropertyInstance::parseValue");
   }
   return value;
 }
@@ -74,7 +88,7 @@ struct BinaryPlan {
 
 template <bool Swap>
 class BinaryBody {
-public:
+ public:
   explicit BinaryBody(ByteWindow& window) : m_window(window) {}
 
   template <class R>
@@ -89,7 +103,7 @@ public:
     return true;
   }
 
-private:
+ private:
   template <class R>
   bool readElement(const Element& element, const BinaryPlan& plan, R& receiver) {
     if (plan.recordSize > 0) return readRecords(element, plan, receiver);
@@ -151,7 +165,8 @@ private:
       const std::uint8_t* bytes = m_window.require(batch * itemSize);
       if (!bytes) return false;
       m_values.resize(done + batch);
-      for (std::size_t k = 0; k < batch; ++k) m_values[done + k] = decodeBinary<Swap>(bytes + k * itemSize, property.type);
+      for (std::size_t k = 0; k < batch; ++k)
+        m_values[done + k] = decodeBinary<Swap>(bytes + k * itemSize, property.type);
       m_window.advance(batch * itemSize);
       done += batch;
     }
@@ -176,7 +191,8 @@ private:
     for (std::uint32_t i = 0; i < element.count; ++i) {
       for (const Property& property : element.properties) {
         std::uint32_t count = 1;
-        if (property.isList && !readCount(property, count)) return failed("Unable to skip property instance.", element, i);
+        if (property.isList && !readCount(property, count))
+          return failed("Unable to skip property instance.", element, i);
         if (!m_window.skip(std::uint64_t(count) * dataTypeSize(property.type))) {
           return failed("Unable to skip property instance.", element, i);
         }
@@ -196,7 +212,7 @@ private:
 };
 
 class AsciiBody {
-public:
+ public:
   explicit AsciiBody(ByteWindow& window) : m_window(window) {}
 
   /// Reads every element; false when the data ended early. After the end, later elements
@@ -215,7 +231,7 @@ public:
     return !m_ended;
   }
 
-private:
+ private:
   enum class Status { ok, invalid, ended };
 
   template <class R>

@@ -18,9 +18,8 @@ std::uint32_t leadingDigits(std::string_view text) {
 }
 
 bool equalsIgnoringCase(std::string_view text, std::string_view lower) {
-  return std::equal(text.begin(), text.end(), lower.begin(), lower.end(), [](char a, char b) {
-    return (a >= 'A' && a <= 'Z' ? static_cast<char>(a - 'A' + 'a') : a) == b;
-  });
+  return std::equal(text.begin(), text.end(), lower.begin(), lower.end(),
+                    [](char a, char b) { return (a >= 'A' && a <= 'Z' ? static_cast<char>(a - 'A' + 'a') : a) == b; });
 }
 
 // For a number out of the type's range: whether it is too large (rather than too small),
@@ -115,7 +114,7 @@ Value parseAsciiValue(std::string_view word, DataType type) {
       const bool negative = !word.empty() && word.front() == '-';
       if (!word.empty() && (word.front() == '-' || word.front() == '+')) word.remove_prefix(1);
       const std::uint32_t digits = leadingDigits(word);
-      value.u = negative ? 0u - digits : digits;
+      value.i = static_cast<std::int32_t>(negative ? 0u - digits : digits);
       break;
     }
     case DataType::uint8:
@@ -126,9 +125,14 @@ Value parseAsciiValue(std::string_view word, DataType type) {
       if (!word.empty() && word.front() == '+') word.remove_prefix(1);
       value.u = leadingDigits(word);
       break;
-    case DataType::float32: value.f = parseReal<float>(word); break;
-    case DataType::float64: value.d = parseReal<double>(word); break;
-    case DataType::none: break;
+    case DataType::float32:
+      value.f = parseReal<float>(word);
+      break;
+    case DataType::float64:
+      value.d = parseReal<double>(word);
+      break;
+    case DataType::none:
+      break;
   }
   return value;
 }

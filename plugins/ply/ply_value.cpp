@@ -21,14 +21,19 @@ std::int64_t truncate(double value) {
 std::int64_t Value::toInteger(DataType type) const {
   switch (type) {
     case DataType::int8:
-    case DataType::uint8:
     case DataType::int16:
-    case DataType::uint16:
     case DataType::int32:
-    case DataType::uint32: return u;
-    case DataType::float32: return truncate(f);
-    case DataType::float64: return truncate(d);
-    case DataType::none: break;
+      return static_cast<std::uint32_t>(i);
+    case DataType::uint8:
+    case DataType::uint16:
+    case DataType::uint32:
+      return u;
+    case DataType::float32:
+      return truncate(f);
+    case DataType::float64:
+      return truncate(d);
+    case DataType::none:
+      break;
   }
   base::raise<base::switch_exception>("ply::Value::convertTo");
 }
@@ -37,13 +42,18 @@ float Value::toFloat(DataType type) const {
   switch (type) {
     case DataType::int8:
     case DataType::int16:
-    case DataType::int32: return static_cast<float>(i);
+    case DataType::int32:
+      return static_cast<float>(i);
     case DataType::uint8:
     case DataType::uint16:
-    case DataType::uint32: return static_cast<float>(u);
-    case DataType::float32: return f;
-    case DataType::float64: return static_cast<float>(d);
-    case DataType::none: break;
+    case DataType::uint32:
+      return static_cast<float>(u);
+    case DataType::float32:
+      return f;
+    case DataType::float64:
+      return static_cast<float>(d);
+    case DataType::none:
+      break;
   }
   base::raise<base::switch_exception>("ply::Value::convertTo");
 }
@@ -61,8 +71,10 @@ float toFP(const Value& value, const Property& property) {
     case DataType::uint32:
       return value.toFloat(property.type) * std::bit_cast<float>(factorBits[static_cast<int>(property.type)]);
     case DataType::float32:
-    case DataType::float64: return value.toFloat(property.type);
-    case DataType::none: break;
+    case DataType::float64:
+      return value.toFloat(property.type);
+    case DataType::none:
+      break;
   }
   base::raise<base::switch_exception>("ply::toFP");
 }

@@ -48,11 +48,20 @@ struct PlyRecorder {
     switch (type) {
       case ply::DataType::int8:
       case ply::DataType::int16:
-      case ply::DataType::int32: return fmt::format("{}", value.i);
-      case ply::DataType::float32: return fmt::format("{}", value.f);
-      case ply::DataType::float64: return fmt::format("{}", value.d);
-      default: return fmt::format("{}", value.u);
+      case ply::DataType::int32:
+        return fmt::format("{}", value.i);
+      case ply::DataType::float32:
+        return fmt::format("{}", value.f);
+      case ply::DataType::float64:
+        return fmt::format("{}", value.d);
+      case ply::DataType::uint8:
+      case ply::DataType::uint16:
+      case ply::DataType::uint32:
+        return fmt::format("{}", value.u);
+      case ply::DataType::none:
+        break;
     }
+    return "none";
   }
 
   std::uint32_t expectedIndex = 0;
@@ -61,8 +70,8 @@ struct PlyRecorder {
 /// Reads `text` as a PLY file from memory, or through a stream that is not in memory.
 inline ply::ReadResult readPly(const std::string& text, PlyRecorder& recorder, ply::Header& header,
                                bool inMemory = true) {
-  base::Stream stream = inMemory ? base::memStream(text.data(), static_cast<std::int64_t>(text.size()))
-                                 : fileLikeStream(text);
+  base::Stream stream =
+      inMemory ? base::memStream(text.data(), static_cast<std::int64_t>(text.size())) : fileLikeStream(text);
   return ply::readFile(header, stream, recorder);
 }
 
