@@ -4,7 +4,7 @@ namespace ply::detail {
 
 void warnEndedEarly(const Element& element, std::uint64_t read) {
   base::log().message(base::logScene, base::logWarning, "The data ends early in element '{}': {} of {} instances read",
-                      displayName(element), read, element.count);
+                      base::clipped(displayName(element)), read, element.count);
 }
 
 BinaryPlan::BinaryPlan(const Element& element) {

@@ -14,12 +14,23 @@ struct TypeWord {
 };
 
 constexpr std::array<TypeWord, 17> typeWords{{
-    {"char", DataType::int8},     {"int8", DataType::int8},       {"uchar", DataType::uint8},
-    {"uint8", DataType::uint8},   {"short", DataType::int16},     {"int16", DataType::int16},
-    {"ushort", DataType::uint16}, {"uint16", DataType::uint16},   {"int32", DataType::int32},
-    {"int", DataType::int32},     {"uint32", DataType::uint32},   {"uint", DataType::uint32},
-    {"float", DataType::float32}, {"float32", DataType::float32}, {"double64", DataType::float64},
-    {"double", DataType::float64}, {"float64", DataType::float64},
+    {"char", DataType::int8},
+    {"int8", DataType::int8},
+    {"uchar", DataType::uint8},
+    {"uint8", DataType::uint8},
+    {"short", DataType::int16},
+    {"int16", DataType::int16},
+    {"ushort", DataType::uint16},
+    {"uint16", DataType::uint16},
+    {"int32", DataType::int32},
+    {"int", DataType::int32},
+    {"uint32", DataType::uint32},
+    {"uint", DataType::uint32},
+    {"float", DataType::float32},
+    {"float32", DataType::float32},
+    {"double64", DataType::float64},
+    {"double", DataType::float64},
+    {"float64", DataType::float64},
 }};
 
 constexpr std::array<std::string_view, 5> elementNames{"vertex", "face", "tristrips", "edge", "material"};
@@ -88,7 +99,7 @@ DataType dataTypeFromWord(std::string_view word) {
   for (const TypeWord& entry : typeWords) {
     if (entry.word == word) return entry.type;
   }
-  base::log().message(base::logScene, base::logError, "Found unknown data type in PLY file: {}!", word);
+  base::log().message(base::logScene, base::logError, "Found unknown data type in PLY file: {}!", base::clipped(word));
   return DataType::none;
 }
 
@@ -96,7 +107,8 @@ ElementSemantic elementSemanticFromName(std::string_view name) {
   for (std::size_t i = 0; i < elementNames.size(); ++i) {
     if (elementNames[i] == name) return static_cast<ElementSemantic>(i);
   }
-  base::log().message(base::logScene, base::logWarning, "Found unknown element semantic in PLY file: {}!", name);
+  base::log().message(base::logScene, base::logWarning, "Found unknown element semantic in PLY file: {}!",
+                      base::clipped(name));
   return ElementSemantic::unknown;
 }
 
@@ -104,21 +116,25 @@ PropertySemantic propertySemanticFromName(std::string_view name) {
   for (const PropertyName& entry : propertyNames) {
     if (entry.name == name) return entry.semantic;
   }
-  base::log().message(base::logScene, base::logWarning, "Found unknown property semantic in PLY file: {}!", name);
+  base::log().message(base::logScene, base::logWarning, "Found unknown property semantic in PLY file: {}!",
+                      base::clipped(name));
   return PropertySemantic::unknown;
 }
 
 std::string_view dataTypeWord(DataType type) {
-  static constexpr std::string_view words[] = {"char", "uchar", "short", "ushort", "int",
+  static constexpr std::string_view words[] = {"char", "uchar", "short",  "ushort", "int",
                                                "uint", "float", "double", "none"};
   return words[std::min(static_cast<std::uint32_t>(type), 8u)];
 }
 
 std::string_view encodingWord(Encoding encoding) {
   switch (encoding) {
-    case Encoding::ascii: return "ascii";
-    case Encoding::binaryLittleEndian: return "binary_little_endian";
-    case Encoding::binaryBigEndian: return "binary_big_endian";
+    case Encoding::ascii:
+      return "ascii";
+    case Encoding::binaryLittleEndian:
+      return "binary_little_endian";
+    case Encoding::binaryBigEndian:
+      return "binary_big_endian";
   }
   return "unknown";
 }

@@ -31,12 +31,12 @@ void skipLine(ByteWindow& window);
 
 /// Reads words. A word's text stays valid until the next call.
 class WordReader {
-public:
+ public:
   /// Skips blanks, then takes word bytes. Empty when the next byte is no word byte or the
   /// data ends. A word is always returned whole, wherever it lies in the data.
   std::string_view read(ByteWindow& window);
 
-private:
+ private:
   base::string m_copy;
 };
 

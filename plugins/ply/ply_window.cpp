@@ -1,6 +1,7 @@
 #include "ply_window.h"
 
 #include "b_exception.h"
+#include "b_log.h"
 
 #include <fmt/format.h>
 
@@ -30,7 +31,29 @@ ByteWindow::ByteWindow(base::Stream& stream, std::uint32_t capacity)
 }
 
 ByteWindow::~ByteWindow() {
-  if (m_stream.has(base::capPosition)) m_stream.setPosition(m_origin + static_cast<std::int64_t>(position()));
+  const std::uint64_t ahead = readAhead();
+  if (giveBack()) return;
+  try {
+    // Only the body reader ends here with bytes read ahead: they lie past the data it read
+    // (or past where it stopped on an error that was reported), so this is no loss.
+    base::log().message(base::logIO, base::logDebug, "stream '{}': {} bytes read ahead could not be given back",
+                        base::clipped(m_stream.name()), ahead);
+  } catch (...) {
+    // Nothing may leave a destructor; the log failing leaves nothing else to tell.
+  }
+}
+
+bool ByteWindow::giveBack() noexcept {
+  if (m_givenBack) return true;
+  m_givenBack = true;
+  if (!m_stream.has(base::capPosition)) return readAhead() == 0;
+  try {
+    const std::int64_t target = m_origin + static_cast<std::int64_t>(position());
+    return m_stream.setPosition(target) == target;
+  } catch (...) {
+    // A buffered source that cannot seek back as far as the window read ahead.
+    return false;
+  }
 }
 
 std::optional<std::uint64_t> ByteWindow::remaining() const {
@@ -66,9 +89,9 @@ bool ByteWindow::refill(std::size_t count) {
 
 const std::uint8_t* ByteWindow::failShort(std::size_t count) {
   if (m_throwOnShortRead) {
-    base::raise<base::exception>("base::Stream::read",
-                                 fmt::format("stream '{}': trying to read {} bytes, read {} bytes", m_stream.name(),
-                                             count, static_cast<std::size_t>(m_end - m_cursor)));
+    base::raise<base::exception>(
+        "base::Stream::read", fmt::format("stream '{}': trying to read {} bytes, read {} bytes", m_stream.name(), count,
+                                          static_cast<std::size_t>(m_end - m_cursor)));
   }
   return nullptr;
 }

@@ -11,12 +11,14 @@ namespace ply {
 /// The reader's own window over a stream: a 256 KiB buffer refilled from the stream, or,
 /// for a stream whose data lies in memory, the stream's memory itself. Text is read byte by
 /// byte with one byte of pushback; binary values are read straight out of the window.
-/// When the window goes, the stream is left at the first byte that was not consumed (when it
-/// can position).
+/// When the window goes, the stream is put back at the first byte that was not consumed
+/// (when it can position); a stream that cannot go back that far is logged (debug level),
+/// never thrown.
 class ByteWindow {
-public:
+ public:
   static constexpr std::uint32_t defaultCapacity = 0x40000;
 
+  /// A capacity of 1 reads the stream byte by byte, never further than a peek.
   explicit ByteWindow(base::Stream& stream, std::uint32_t capacity = defaultCapacity);
   ~ByteWindow();
   ByteWindow(const ByteWindow&) = delete;
@@ -57,7 +59,13 @@ public:
   /// Bytes left in the data when the stream knows its size.
   std::optional<std::uint64_t> remaining() const;
 
-private:
+  /// Bytes taken from the stream but not consumed.
+  std::uint64_t readAhead() const { return m_inMemory ? 0 : static_cast<std::uint64_t>(m_end - m_cursor); }
+  /// Puts the stream at the first byte not consumed; false when it cannot go back that far.
+  /// Runs once: the window is of no further use after it.
+  bool giveBack() noexcept;
+
+ private:
   bool refill(std::size_t count);
   const std::uint8_t* failShort(std::size_t count);
 
@@ -71,6 +79,7 @@ private:
   std::size_t m_capacity;
   bool m_inMemory;
   bool m_throwOnShortRead;
+  bool m_givenBack = false;
 };
 
 }  // namespace ply

@@ -10,6 +10,7 @@ namespace {
 
 using namespace std::string_literals;
 using testing_support::LogCapture;
+using testing_support::Source;
 
 struct Parsed {
   bool ok;
@@ -54,6 +55,19 @@ TEST(PlyHeader, RejectedHeadersSayWhy) {
       {"ply\nformat ascii 1.0\nproperty float x\nelement vertex 0\nend_header\n",
        "Invalid .ply file: property declared before any element"},
       {"ply\nformat ascii 1.0\nelement vertex 0\nEND_HEADER\n", "Error reading ply header."},
+      // A declaration takes its words from its own line, whatever ends the line.
+      {"ply\nformat ascii 1.0\nelement vertex 1\nproperty float\nelement face 1\nend_header\n",
+       "Invalid .ply file: line 4 ends before the property's name"},
+      {"ply\nformat ascii 1.0\nelement vertex\nproperty float x\nend_header\n",
+       "Invalid .ply file: line 3 ends before the count of element 'vertex'"},
+      {"ply\r\nformat ascii 1.0\r\ncomment a\r\n\r\nobj_info b\r\nelement \t\r\n",
+       "Invalid .ply file: line 6 ends before the element's name"},
+      {"ply\rformat ascii 1.0\relement face 1\rproperty list uchar\rint vertex_indices\r",
+       "Invalid .ply file: line 4 ends before the list's item type"},
+      {"ply\nformat ascii 1.0\nelement face 1\nproperty list\n",
+       "Invalid .ply file: line 4 ends before the list's count type"},
+      {"ply\nformat ascii 1.0\nelement face 1\nproperty", "Invalid .ply file: line 4 ends before the property's type"},
+      {"ply\nformat\nascii 1.0\nend_header\n", "Invalid .ply file: line 2 ends before the format's encoding"},
   };
   for (const auto& [text, message] : cases) {
     const Parsed parsed = parse(text);
@@ -107,16 +121,63 @@ TEST(PlyHeader, ElementsAndPropertiesWithTheirSemantics) {
 }
 
 TEST(PlyHeader, KeywordsAreCaseSensitiveAndUnknownLinesAreSkipped) {
-  const Parsed parsed = parse("ply\nformat ascii 1.0\nobj_info made here\nELEMENT vertex 1\ncomment quiet\nend_header\n");
+  const Parsed parsed =
+      parse("ply\nformat ascii 1.0\nobj_info made here\nELEMENT vertex 1\ncomment quiet\nend_header\n");
   EXPECT_TRUE(parsed.ok);
   EXPECT_TRUE(parsed.header.elements.empty());
   EXPECT_EQ(parsed.log, (std::vector<std::string>{"Skipped unknown header element obj_info!",
                                                   "Skipped unknown header element ELEMENT!"}));
 }
 
+TEST(PlyHeader, WordsLeftAfterADeclarationAreKeywords) {
+  const Parsed parsed = parse(
+      "ply format ascii 1.0\nelement vertex 1 property float x\n\n  property float y extra\n"
+      "end_header\n1 2\n");
+  ASSERT_TRUE(parsed.ok);
+  ASSERT_EQ(parsed.header.elements.at(0).properties.size(), 2u);
+  EXPECT_EQ(parsed.log, std::vector<std::string>{"Skipped unknown header element extra!"});
+}
+
+TEST(PlyHeader, WordsFromTheFileAreCutInMessages) {
+  const std::string huge(1'000'000, 'k');
+  const Parsed parsed = parse("ply\nformat ascii 1.0\n" + huge + "\nelement " + huge + " 0\nend_header\n");
+  ASSERT_TRUE(parsed.ok);
+  const std::string clipped = std::string(80, 'k') + "...";
+  EXPECT_EQ(parsed.log, (std::vector<std::string>{"Skipped unknown header element " + clipped + "!",
+                                                  "Found unknown element semantic in PLY file: " + clipped + "!"}));
+}
+
+// The body is read later from the same stream: parseHeader must leave it at the first body
+// byte even where the stream cannot go back far (before, a pipe behind a read buffer
+// aborted the process when the header's read-ahead was given back).
+TEST(PlyHeader, LeavesEveryKindOfStreamAtTheFirstBodyByte) {
+  const std::string head = "ply\nformat binary_little_endian 1.0\nelement vertex 2\nproperty uchar x\nend_header\n";
+  const std::string body = "\x0a\x20" + std::string(100000, 'b');
+  for (Source source : testing_support::allSources) {
+    SCOPED_TRACE(testing_support::sourceName(source));
+    LogCapture capture(base::logWarning);
+    base::Stream stream = testing_support::sourceStream(head + body, source);
+    ply::Header header;
+    ASSERT_TRUE(ply::parseHeader(header, stream));
+    EXPECT_EQ(testing_support::readAll(stream), body);
+    EXPECT_TRUE(capture.entries.empty());
+  }
+}
+
+TEST(PlyHeader, APipeThatCannotTakeBackAPeekedByteFailsTheHeader) {
+  // A lone CR ends the header line: the byte after it is peeked for an LF.
+  LogCapture capture(base::logWarning);
+  base::Stream pipe = testing_support::sourceStream("ply\rformat ascii 1.0\rend_header\r7", Source::pipe);
+  ply::Header header;
+  EXPECT_FALSE(ply::parseHeader(header, pipe));
+  EXPECT_EQ(capture.texts(),
+            std::vector<std::string>{"stream 'file-like': the 1 bytes read past the header cannot be given back"});
+}
+
 TEST(PlyHeader, CountWordsTakeTheirLeadingDigits) {
   EXPECT_EQ(parse("ply\nformat ascii 1.0\nelement vertex 8abc\nend_header\n" + std::string(20, '1'))
-                .header.elements.at(0).count,
+                .header.elements.at(0)
+                .count,
             8u);
   EXPECT_EQ(parse("ply\nformat ascii 1.0\nelement vertex -5\nend_header\n").header.elements.at(0).count, 0u);
 }
@@ -124,8 +185,9 @@ TEST(PlyHeader, CountWordsTakeTheirLeadingDigits) {
 TEST(PlyHeader, OnlyOneLineBreakEndsTheHeader) {
   // Each body starts with a byte that is also white space; it must stay in the body.
   for (const std::string breakAndBody : {"\n\n\x01", "\r\n\r\x01", "\r\r\x01", "\r \x01", "\n\t\x01"}) {
-    const std::string head = "ply\r\nformat binary_little_endian 1.0\r\nelement vertex 1\r\nproperty uchar a\r\n"
-                             "property uchar b\r\nend_header \t";
+    const std::string head =
+        "ply\r\nformat binary_little_endian 1.0\r\nelement vertex 1\r\nproperty uchar a\r\n"
+        "property uchar b\r\nend_header \t";
     const Parsed parsed = parse(head + breakAndBody);
     ASSERT_TRUE(parsed.ok);
     const std::size_t lineBreak = breakAndBody[0] == '\r' && breakAndBody[1] == '\n' ? 2 : 1;

@@ -1,5 +1,5 @@
-#include "b_exception.h"
 #include "ply_value.h"
+#include "b_exception.h"
 
 #include <gtest/gtest.h>
 

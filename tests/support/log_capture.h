@@ -10,7 +10,7 @@ namespace testing_support {
 /// Collects every log message while alive, at the given level, and keeps standard error
 /// quiet; restores the log's level and standard error when destroyed.
 class LogCapture : public base::LogSink {
-public:
+ public:
   struct Entry {
     base::name_id category;
     int level;
@@ -41,7 +41,7 @@ public:
 
   std::vector<Entry> entries;
 
-private:
+ private:
   int m_previousLevel;
 };
 

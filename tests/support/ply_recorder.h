@@ -67,11 +67,10 @@ struct PlyRecorder {
   std::uint32_t expectedIndex = 0;
 };
 
-/// Reads `text` as a PLY file from memory, or through a stream that is not in memory.
+/// Reads `text` as a PLY file from the kind of stream `source` names.
 inline ply::ReadResult readPly(const std::string& text, PlyRecorder& recorder, ply::Header& header,
-                               bool inMemory = true) {
-  base::Stream stream =
-      inMemory ? base::memStream(text.data(), static_cast<std::int64_t>(text.size())) : fileLikeStream(text);
+                               Source source = Source::memory) {
+  base::Stream stream = sourceStream(text, source);
   return ply::readFile(header, stream, recorder);
 }
 

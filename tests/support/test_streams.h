@@ -12,7 +12,7 @@ namespace testing_support {
 /// A source that is not in memory as far as callers can tell (no 0x40, no getMemory), like a
 /// file: it reads, positions and has a size. Counts the reads that reach it.
 class FileLikeWorker : public base::StreamWorker {
-public:
+ public:
   FileLikeWorker(std::string data, std::uint32_t capabilities = base::capRead | base::capPosition | base::capSize)
       : StreamWorker(capabilities, "file-like"), m_data(std::move(data)) {}
 
@@ -24,8 +24,8 @@ public:
     return n;
   }
   std::int64_t setPosition(std::int64_t offset, std::uint32_t origin) override {
-    std::int64_t target = offset + (origin == base::seekCurrent ? getPosition() : 0) +
-                          (origin == base::seekEnd ? getSize() : 0);
+    std::int64_t target =
+        offset + (origin == base::seekCurrent ? getPosition() : 0) + (origin == base::seekEnd ? getSize() : 0);
     m_position = static_cast<std::size_t>(std::clamp<std::int64_t>(target, 0, getSize()));
     return getPosition();
   }
@@ -35,7 +35,7 @@ public:
 
   int reads = 0;
 
-private:
+ private:
   std::string m_data;
   std::size_t m_position = 0;
 };
@@ -44,6 +44,31 @@ private:
 inline base::Stream fileLikeStream(std::string data,
                                    std::uint32_t capabilities = base::capRead | base::capPosition | base::capSize) {
   return base::Stream::adopt(new FileLikeWorker(std::move(data), capabilities));
+}
+
+/// Where a test's bytes come from: memory; a file (it reads, positions and has a size); a
+/// pipe (it only reads); a read buffer over a pipe (it positions only within its buffer).
+enum class Source { memory, file, pipe, bufferedPipe };
+inline constexpr Source allSources[] = {Source::memory, Source::file, Source::pipe, Source::bufferedPipe};
+
+inline const char* sourceName(Source source) {
+  constexpr const char* names[] = {"memory", "file", "pipe", "buffered pipe"};
+  return names[static_cast<int>(source)];
+}
+
+/// A stream over a copy of `data`, of the kind `source` names.
+inline base::Stream sourceStream(const std::string& data, Source source) {
+  switch (source) {
+    case Source::memory:
+      return base::memStream(data.data(), static_cast<std::int64_t>(data.size()));
+    case Source::file:
+      return fileLikeStream(data);
+    case Source::pipe:
+      return fileLikeStream(data, base::capRead);
+    case Source::bufferedPipe:
+      return base::bufReadStream(fileLikeStream(data, base::capRead), 0, 4096);
+  }
+  return {};
 }
 
 /// Everything a stream has left, read through its handle.
