@@ -1,6 +1,7 @@
 # Third-party libraries, all from Debian packages. The Windows cross build has no MinGW
 # packages of the header-only libraries, so it reads their Debian headers through a
-# directory that holds nothing else (the host's /usr/include must stay out of its path).
+# directory that holds nothing else (the host's /usr/include must stay out of its path),
+# under the same target names that the packages' own CMake files give.
 find_package(ZLIB REQUIRED)
 
 if(CMAKE_CROSSCOMPILING)
@@ -11,24 +12,20 @@ if(CMAKE_CROSSCOMPILING)
       file(CREATE_LINK /usr/include/${dir} ${MESHPORT_HOST_HEADERS}/${dir} SYMBOLIC)
     endif()
   endforeach()
-  add_library(meshport_fmt INTERFACE)
-  target_include_directories(meshport_fmt SYSTEM INTERFACE ${MESHPORT_HOST_HEADERS})
-  target_compile_definitions(meshport_fmt INTERFACE FMT_HEADER_ONLY)
-  add_library(meshport_cli11 INTERFACE)
-  target_include_directories(meshport_cli11 SYSTEM INTERFACE ${MESHPORT_HOST_HEADERS})
-  add_library(meshport_rapidjson INTERFACE)
-  target_include_directories(meshport_rapidjson SYSTEM INTERFACE ${MESHPORT_HOST_HEADERS})
+  add_library(fmt::fmt INTERFACE IMPORTED)
+  target_include_directories(fmt::fmt SYSTEM INTERFACE ${MESHPORT_HOST_HEADERS})
+  target_compile_definitions(fmt::fmt INTERFACE FMT_HEADER_ONLY)
+  add_library(CLI11::CLI11 INTERFACE IMPORTED)
+  target_include_directories(CLI11::CLI11 SYSTEM INTERFACE ${MESHPORT_HOST_HEADERS})
+  set(MESHPORT_RAPIDJSON_INCLUDE ${MESHPORT_HOST_HEADERS})
 else()
   find_package(fmt REQUIRED)
   find_package(CLI11 REQUIRED)
-  add_library(meshport_fmt INTERFACE)
-  target_link_libraries(meshport_fmt INTERFACE fmt::fmt)
-  add_library(meshport_cli11 INTERFACE)
-  target_link_libraries(meshport_cli11 INTERFACE CLI11::CLI11)
   find_path(MESHPORT_RAPIDJSON_INCLUDE rapidjson/document.h REQUIRED)
-  add_library(meshport_rapidjson INTERFACE)
-  target_include_directories(meshport_rapidjson SYSTEM INTERFACE ${MESHPORT_RAPIDJSON_INCLUDE})
 endif()
+# Header-only, used by scenetool alone; never part of the installed package.
+add_library(meshport_rapidjson INTERFACE)
+target_include_directories(meshport_rapidjson SYSTEM INTERFACE ${MESHPORT_RAPIDJSON_INCLUDE})
 
 if(MESHPORT_BUILD_TESTS)
   find_package(GTest REQUIRED)

@@ -2,8 +2,8 @@
 
 #include "b_exception.h"
 
-#include <bit>
 #include <cstdint>
+#include <limits>
 
 namespace ply {
 namespace {
@@ -15,6 +15,10 @@ std::int64_t truncate(double value) {
   if (value <= -9223372036854775808.0) return INT64_MIN;
   return static_cast<std::int64_t>(value);
 }
+
+// One over the type's largest value, in single precision: uchar gives 1/255.
+template <class T>
+constexpr float unitFactor = 1.0f / static_cast<float>(std::numeric_limits<T>::max());
 
 }  // namespace
 
@@ -59,9 +63,8 @@ float Value::toFloat(DataType type) const {
 }
 
 float toFP(const Value& value, const Property& property) {
-  // Single-precision factors of 1/127, 1/255, 1/32767, 1/65535, 1/2147483647, 1/4294967295.
-  static constexpr std::uint32_t factorBits[] = {0x3C010204, 0x3B808081, 0x38000100,
-                                                 0x37800080, 0x30000000, 0x2F800000};
+  static constexpr float factors[] = {unitFactor<std::int8_t>,   unitFactor<std::uint8_t>, unitFactor<std::int16_t>,
+                                      unitFactor<std::uint16_t>, unitFactor<std::int32_t>, unitFactor<std::uint32_t>};
   switch (property.type) {
     case DataType::int8:
     case DataType::uint8:
@@ -69,7 +72,7 @@ float toFP(const Value& value, const Property& property) {
     case DataType::uint16:
     case DataType::int32:
     case DataType::uint32:
-      return value.toFloat(property.type) * std::bit_cast<float>(factorBits[static_cast<int>(property.type)]);
+      return value.toFloat(property.type) * factors[static_cast<int>(property.type)];
     case DataType::float32:
     case DataType::float64:
       return value.toFloat(property.type);

@@ -27,6 +27,17 @@ enum StreamCapability : std::uint32_t {
   capReopen = 0x200,
 };
 
+/// What each kind of worker offers, named once.
+inline constexpr std::uint32_t capsReadOnly = capRead | capPosition | capSize;
+inline constexpr std::uint32_t capsReadWrite = capsReadOnly | capWrite | capSetSize;
+inline constexpr std::uint32_t capsNull = capsReadWrite | capSource | capReopen;
+inline constexpr std::uint32_t capsMemory = capsReadWrite | capMemory | capInMemory;
+inline constexpr std::uint32_t capsMemoryView = capsReadOnly | capMemory | capInMemory;
+inline constexpr std::uint32_t capsSubStream = capsReadOnly | capMemory;
+/// Buffers add what their source offers (its size, its memory access) to these.
+inline constexpr std::uint32_t capsBufferedRead = capRead | capPosition | capSource;
+inline constexpr std::uint32_t capsBufferedWrite = capWrite | capSource;
+
 /// Flag bits of a stream handle.
 enum StreamFlag : std::uint32_t {
   throwOnShortRead = 0x1,
@@ -42,7 +53,7 @@ enum SeekOrigin : std::uint32_t { seekBegin = 0, seekCurrent = 1, seekEnd = 2 };
 /// null stream: reads and writes report the full count and touch nothing, positions and
 /// size are 0, it is always at its end, and its source and reopen are itself.
 class BASE1_API StreamWorker : public HostAllocated {
-public:
+ public:
   StreamWorker(std::uint32_t capabilities, std::string_view name);
   virtual ~StreamWorker();
   StreamWorker(const StreamWorker&) = delete;
@@ -77,12 +88,12 @@ public:
   void release() noexcept;
   std::uint32_t refCount() const noexcept { return m_count.load(std::memory_order_relaxed); }
 
-protected:
+ protected:
   void setCapabilities(std::uint32_t capabilities) { m_capabilities = capabilities; }
   /// A handle on this worker that takes a reference, with default tag and flags.
   Stream self();
 
-private:
+ private:
   std::atomic<std::uint32_t> m_count{1};
   std::uint32_t m_capabilities;
   base::string m_name;
@@ -93,7 +104,7 @@ private:
 /// reference to its worker. `tag` is carried along into derived streams (the PLY reader keeps
 /// the data's byte order in it); `flags` says which short counts throw.
 class BASE1_API Stream {
-public:
+ public:
   Stream() = default;
   /// Takes over the reference that `worker` was created with.
   static Stream adopt(StreamWorker* worker);
@@ -137,7 +148,7 @@ public:
   std::uint64_t tag = 0;
   std::uint32_t flags = throwOnSkipPastEnd;
 
-private:
+ private:
   StreamWorker* m_worker = nullptr;
 };
 

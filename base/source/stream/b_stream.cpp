@@ -13,11 +13,15 @@ namespace {
 
 constexpr std::uint32_t copyPiece = 0x40000;
 
+// The capability words are part of the workers' contract: their values never change.
+static_assert(capsNull == 799 && capsMemory == 127 && capsMemoryView == 109 && capsSubStream == 45);
+static_assert(capsReadWrite == 31 && capsReadOnly == 13 && capsBufferedRead == 261 && capsBufferedWrite == 258);
+
 // The null stream: swallows writes, answers reads with the full count and is always at
 // its end.
 class NullStreamWorker final : public StreamWorker {
  public:
-  NullStreamWorker() : StreamWorker(799, "null") {}
+  NullStreamWorker() : StreamWorker(capsNull, "null") {}
   std::uint32_t read(void*, std::uint32_t count) override { return count; }
   std::uint32_t write(const void*, std::uint32_t count) override { return count; }
   bool isEOF() override { return true; }

@@ -277,7 +277,7 @@ class BufWriteWorker final : public BufferedWorker {
 };
 
 std::uint32_t readCapabilities(const Stream& source) {
-  std::uint32_t capabilities = capRead | capPosition | capSource;
+  std::uint32_t capabilities = capsBufferedRead;
   if (source.has(capSize)) capabilities |= capSize;
   if (source.has(capMemory)) capabilities |= capMemory;
   return capabilities;
@@ -304,7 +304,7 @@ Stream charStream(const Stream& source, std::uint32_t bufferSize, std::string_vi
 }
 
 Stream bufWriteStream(const Stream& destination, std::uint32_t bufferSize, std::string_view name) {
-  const std::uint32_t capabilities = capWrite | capSource | (destination.has(capSize) ? std::uint32_t(capSize) : 0u);
+  const std::uint32_t capabilities = capsBufferedWrite | (destination.has(capSize) ? std::uint32_t(capSize) : 0u);
   return withTag(Stream::adopt(new BufWriteWorker(capabilities, destination, bufferSize, name)), destination);
 }
 

@@ -13,25 +13,36 @@ std::int64_t clampPosition(std::int64_t target, std::int64_t size) { return std:
 bool seekTarget(std::int64_t offset, std::uint32_t origin, std::int64_t position, std::int64_t size,
                 std::int64_t& target) {
   switch (origin) {
-    case seekBegin: target = offset; return true;
-    case seekCurrent: target = position + offset; return true;
-    case seekEnd: target = size + offset; return true;
-    default: return false;
+    case seekBegin:
+      target = offset;
+      return true;
+    case seekCurrent:
+      target = position + offset;
+      return true;
+    case seekEnd:
+      target = size + offset;
+      return true;
+    default:
+      return false;
   }
 }
 
 // A block in memory, owned (growing on writes past the end) or a read-only view of memory
 // that the caller keeps alive.
 class MemStreamWorker final : public StreamWorker {
-public:
+ public:
   // Owned.
   explicit MemStreamWorker(base::vector<std::uint8_t>&& block)
-      : StreamWorker(127, "memory"), m_block(std::move(block)), m_data(m_block.data()),
+      : StreamWorker(capsMemory, "memory"),
+        m_block(std::move(block)),
+        m_data(m_block.data()),
         m_size(static_cast<std::int64_t>(m_block.size())) {}
   // View.
   MemStreamWorker(const void* data, std::int64_t size, std::string_view name)
-      : StreamWorker(109, name), m_data(size > 0 ? static_cast<const std::uint8_t*>(data) : nullptr),
-        m_size(size > 0 ? size : 0), m_view(true) {}
+      : StreamWorker(capsMemoryView, name),
+        m_data(size > 0 ? static_cast<const std::uint8_t*>(data) : nullptr),
+        m_size(size > 0 ? size : 0),
+        m_view(true) {}
 
   const std::uint8_t* getMemory(std::int64_t* offset, std::int64_t* size) override {
     if (offset) *offset = 0;
@@ -73,7 +84,7 @@ public:
     StreamWorker::close();
   }
 
-private:
+ private:
   void resize(std::int64_t size) {
     // Capacity grows by the growth rule; the size is exactly what was asked.
     base::reserveForAppend(m_block, static_cast<std::size_t>(size) - std::min(m_block.size(), std::size_t(size)));
@@ -91,8 +102,8 @@ private:
 
 // One block per write; reads and seeks walk the chain.
 class MemBlockStreamWorker final : public StreamWorker {
-public:
-  MemBlockStreamWorker() : StreamWorker(31, "memory blocks") {}
+ public:
+  MemBlockStreamWorker() : StreamWorker(capsReadWrite, "memory blocks") {}
 
   std::uint32_t read(void* buffer, std::uint32_t count) override {
     auto* out = static_cast<std::uint8_t*>(buffer);
@@ -146,7 +157,7 @@ public:
     StreamWorker::close();
   }
 
-private:
+ private:
   void nextBlock() {
     ++m_block;
     m_offset = 0;
@@ -164,8 +175,9 @@ template <class Container, bool Writable>
 class ContainerStreamWorker final : public StreamWorker {
   using Reference = std::conditional_t<Writable, Container&, const Container&>;
 
-public:
-  ContainerStreamWorker(Reference data, std::string_view name) : StreamWorker(Writable ? 31 : 13, name), m_data(data) {}
+ public:
+  ContainerStreamWorker(Reference data, std::string_view name)
+      : StreamWorker(Writable ? capsReadWrite : capsReadOnly, name), m_data(data) {}
 
   std::uint32_t read(void* buffer, std::uint32_t count) override {
     // The caller may have shrunk the container behind the stream's back.
@@ -200,7 +212,7 @@ public:
   }
   bool isEOF() override { return m_position >= size(); }
 
-private:
+ private:
   std::int64_t size() const { return static_cast<std::int64_t>(m_data.size()); }
 
   Reference m_data;

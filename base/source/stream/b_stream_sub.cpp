@@ -9,9 +9,9 @@ namespace {
 // A window onto a parent stream. It reads at the parent's position, so it keeps no position
 // of its own; setPosition moves the parent.
 class SubStreamWorker final : public StreamWorker {
-public:
+ public:
   SubStreamWorker(const Stream& parent, std::int64_t offset, std::int64_t length, std::string_view name)
-      : StreamWorker(45, name.empty() ? std::string_view(parent.name()) : name),
+      : StreamWorker(capsSubStream, name.empty() ? std::string_view(parent.name()) : name),
         m_parent(parent),
         m_offset(offset),
         m_length(length) {
@@ -47,7 +47,7 @@ public:
     StreamWorker::close();
   }
 
-private:
+ private:
   Stream m_parent;
   std::int64_t m_offset;
   std::int64_t m_length;

@@ -26,10 +26,12 @@ TEST(BufReadStream, InMemorySourceIsReturnedAsItIs) {
 }
 
 TEST(BufReadStream, CapabilitiesFollowTheSource) {
-  EXPECT_EQ(base::bufReadStream(fileLikeStream("x"), 0, 64).worker()->capabilities(), 261u + 8u);
-  EXPECT_EQ(base::bufReadStream(fileLikeStream("x", base::capRead), 0, 64).worker()->capabilities(), 261u);
-  EXPECT_EQ(base::bufWriteStream(base::memStream(0), 64).worker()->capabilities(), 266u);
-  EXPECT_EQ(base::bufWriteStream(fileLikeStream("", base::capWrite), 64).worker()->capabilities(), 258u);
+  // A size only where the source has one; never in memory, so buffers never stack up.
+  EXPECT_TRUE(base::bufReadStream(fileLikeStream("x"), 0, 64).has(base::capSize));
+  EXPECT_FALSE(base::bufReadStream(fileLikeStream("x", base::capRead), 0, 64).has(base::capSize));
+  EXPECT_FALSE(base::bufReadStream(fileLikeStream("x"), 0, 64).has(base::capInMemory));
+  EXPECT_TRUE(base::bufWriteStream(base::memStream(0), 64).has(base::capSize));
+  EXPECT_FALSE(base::bufWriteStream(fileLikeStream("", base::capWrite), 64).has(base::capSize));
 }
 
 TEST(BufReadStream, ReadsAcrossRefillsWithFewSourceCalls) {

@@ -34,7 +34,6 @@ TEST(SubStream, WindowIsCutAtTheParentsEnd) {
   EXPECT_EQ(window.getSize(), 2);
   EXPECT_EQ(window.tag, 1u);
   EXPECT_EQ(window.name(), "parent");
-  EXPECT_EQ(window.worker()->capabilities(), 45u);
   EXPECT_EQ(readAll(window), "cd");
   EXPECT_TRUE(window.isEOF());
 }
