@@ -28,11 +28,14 @@ struct fmt::formatter<Counted> : fmt::formatter<int> {
 
 namespace {
 
-TEST(Log, MessagesAboveTheLevelAreDroppedBeforeFormatting) {
+TEST(Log, MessagesAboveTheLevelOrEmptyAreDroppedBeforeFormatting) {
   LogCapture capture(base::logWarning);
   int formatted = 0;
   base::log().message(base::logScene, base::logInfo, "value {}", Counted{&formatted});
   base::log().message(base::logScene, base::logDebug, "value {}", Counted{&formatted});
+  base::log().text(base::logScene, base::logInfo, "finished text");
+  base::log().message(base::logIO, base::logError, "");
+  base::log().text(base::logIO, base::logError, "");
   EXPECT_EQ(formatted, 0);
   EXPECT_TRUE(capture.entries.empty());
 
@@ -44,28 +47,14 @@ TEST(Log, MessagesAboveTheLevelAreDroppedBeforeFormatting) {
   EXPECT_EQ(capture.entries[0].category, base::logScene);
 }
 
-TEST(Log, EmptyFormatIsDropped) {
+TEST(Log, PlaceholdersAreFilledButAMessageWithoutArgumentsIsNotAFormat) {
   LogCapture capture;
-  base::log().message(base::logIO, base::logError, "");
-  base::log().text(base::logIO, base::logError, "");
-  EXPECT_TRUE(capture.entries.empty());
-}
-
-TEST(Log, PlaceholdersAreFilledInTurnAndHexWorks) {
-  LogCapture capture;
-  base::log().message(base::logSystem, base::logError, "plugin {} of {} at {:x}", 3, "mesh", 255u);
+  base::log().message(base::logSystem, base::logError, "plugin {} at {:x}", "mesh", 255u);
   base::log().message(base::logSystem, base::logError, "no arguments: {} stays");
-  EXPECT_EQ(capture.texts(), (std::vector<std::string>{"plugin 3 of mesh at ff", "no arguments: {} stays"}));
+  EXPECT_EQ(capture.texts(), (std::vector<std::string>{"plugin mesh at ff", "no arguments: {} stays"}));
 }
 
-TEST(Log, CategoriesAreTheInternedNames) {
-  EXPECT_EQ(base::logScene, base::intern("scene"));
-  EXPECT_EQ(base::logSystem, base::intern("system"));
-  EXPECT_EQ(base::logIO, base::intern("io"));
-  EXPECT_EQ(base::logAll, base::intern("all"));
-}
-
-TEST(Log, FileSinkAppendsLevelCategoryAndText) {
+TEST(Log, FileSinkAppendsLevelCategoryAndTextOrSaysWhyItCannot) {
   const std::string path = ::testing::TempDir() + "meshport_log_test.txt";
   std::remove(path.c_str());
   std::string error;
@@ -78,6 +67,9 @@ TEST(Log, FileSinkAppendsLevelCategoryAndText) {
   std::stringstream content;
   content << file.rdbuf();
   EXPECT_NE(content.str().find("warning [io] stream 'a.ply' is short\n"), std::string::npos) << content.str();
+
+  EXPECT_FALSE(base::log().setFile("/nonexistent-dir/x/log.txt", error));
+  EXPECT_EQ(error, "No such file or directory");
 }
 
 // A sink that logs while it writes: before the fix this deadlocked on the log's own lock.
@@ -97,8 +89,8 @@ TEST(Log, SinkThatLogsNeitherDeadlocksNorRecursesForever) {
   base::log().removeSink(&echo);
   EXPECT_GT(echo.calls, 1);
   EXPECT_LT(echo.calls, 10);
-  ASSERT_FALSE(capture.entries.empty());
-  EXPECT_EQ(capture.entries.front().text, "first");
+  ASSERT_GE(capture.entries.size(), 2u);
+  EXPECT_EQ(capture.entries[0].text, "first");
   EXPECT_EQ(capture.entries[1].text, "echo of first");
 }
 
@@ -110,12 +102,6 @@ TEST(Log, ClippedCutsLongWordsOnly) {
   std::string accents;
   for (int i = 0; i < 50; ++i) accents += "\xC3\xA9";
   EXPECT_EQ(base::clipped(accents, 5), "\xC3\xA9\xC3\xA9...");
-}
-
-TEST(Log, FileSinkThatCannotOpenSaysWhy) {
-  std::string error;
-  EXPECT_FALSE(base::log().setFile("/nonexistent-dir/x/log.txt", error));
-  EXPECT_EQ(error, "No such file or directory");
 }
 
 }  // namespace

@@ -21,6 +21,28 @@ struct Local : base::RefCnt {
   int* destroyed;
 };
 
+// Runs `work` on `count` threads at once and waits for all of them.
+template <class Work>
+void inParallel(int count, Work work) {
+  std::vector<std::thread> threads;
+  for (int t = 0; t < count; ++t) threads.emplace_back(work);
+  for (auto& thread : threads) thread.join();
+}
+
+// A weak reference reads null once the last strong one went, with either kind of count.
+template <class Object, class Counter>
+void expectWeakClearedOnLastRelease() {
+  Counter destroyed = 0;
+  base::weak_ref<Object> weak;
+  {
+    base::ref<Object> strong(new Object(&destroyed));
+    weak.set(strong.get());
+    EXPECT_TRUE(weak.visit([&](Object* target) { return target == strong.get(); }));
+  }
+  EXPECT_TRUE(weak.expired());
+  EXPECT_EQ(destroyed, 1);
+}
+
 TEST(Ref, CountsFromZeroAndDestroysOnTheLastRelease) {
   std::atomic<int> destroyed = 0;
   auto* object = new Counted(&destroyed);
@@ -47,15 +69,8 @@ TEST(Ref, SelfAssignmentKeepsTheObject) {
 }
 
 TEST(WeakRef, ReadsNullAfterTheLastReleaseAndOutlivesItsTarget) {
-  std::atomic<int> destroyed = 0;
-  base::weak_ref<Counted> weak;
-  {
-    base::ref<Counted> strong(new Counted(&destroyed));
-    weak.set(strong.get());
-    EXPECT_TRUE(weak.visit([&](Counted* target) { return target == strong.get(); }));
-  }
-  EXPECT_TRUE(weak.expired());
-  EXPECT_EQ(destroyed, 1);
+  expectWeakClearedOnLastRelease<Counted, std::atomic<int>>();
+  expectWeakClearedOnLastRelease<Local, int>();
 }
 
 TEST(WeakRef, HolderGoingFirstUnlinksItsNode) {
@@ -82,28 +97,12 @@ TEST(WeakRef, ObjectDestroyedWithoutReleaseClearsItsWeakReferences) {
   EXPECT_TRUE(weak.expired());
 }
 
-TEST(WeakRef, SingleThreadedCountClearsWeakReferencesToo) {
-  int destroyed = 0;
-  base::weak_ref<Local> weak;
-  {
-    base::ref<Local> strong(new Local(&destroyed));
-    weak.set(strong.get());
-    EXPECT_FALSE(weak.expired());
-  }
-  EXPECT_EQ(destroyed, 1);
-  EXPECT_TRUE(weak.expired());
-}
-
 TEST(RefCntAtomic, ConcurrentReferencesDestroyExactlyOnce) {
   std::atomic<int> destroyed = 0;
   base::ref<Counted> shared(new Counted(&destroyed));
-  std::vector<std::thread> threads;
-  for (int t = 0; t < 4; ++t) {
-    threads.emplace_back([&shared] {
-      for (int i = 0; i < 20000; ++i) base::ref<Counted> copy = shared;
-    });
-  }
-  for (auto& thread : threads) thread.join();
+  inParallel(4, [&shared] {
+    for (int i = 0; i < 20000; ++i) base::ref<Counted> copy = shared;
+  });
   EXPECT_EQ(shared->refCount(), 1);
   shared.reset();
   EXPECT_EQ(destroyed, 1);
@@ -119,68 +118,40 @@ TEST(WeakRef, RacingTheLastReleaseNeverSeesAFreedTarget) {
     base::ref<Counted> b(object);
     base::weak_ref<Counted> early(object);
     auto dropped = std::make_unique<base::weak_ref<Counted>>(object);
-    std::atomic<bool> go = false;
-    std::thread reader([&] {
-      while (!go) {
+    std::atomic<int> started = 0;
+    inParallel(4, [&] {
+      const int role = started++;
+      while (started < 4) {
       }
-      for (int i = 0; i < 50; ++i) early.visit([](Counted* target) { return target ? target->refCount() : -1; });
-    });
-    // A holder that goes while the target dies unlinks or finds itself cleared, never both.
-    std::thread holder([&] {
-      while (!go) {
+      switch (role) {
+        case 0:
+          for (int i = 0; i < 50; ++i) early.visit([](Counted* target) { return target ? target->refCount() : -1; });
+          break;
+        case 1:  // a holder that goes while the target dies unlinks or finds itself cleared, never both
+          dropped.reset();
+          break;
+        case 2:
+          a.reset();
+          break;
+        default:
+          b.reset();
       }
-      dropped.reset();
     });
-    std::thread dropA([&] {
-      while (!go) {
-      }
-      a.reset();
-    });
-    std::thread dropB([&] {
-      while (!go) {
-      }
-      b.reset();
-    });
-    go = true;
-    reader.join();
-    holder.join();
-    dropA.join();
-    dropB.join();
     EXPECT_EQ(destroyed, 1);
     EXPECT_TRUE(early.expired());
   }
 }
 
-TEST(SpinLock, BackOffSteps) {
-  using B = base::SpinLock::BackOff;
-  EXPECT_EQ(base::SpinLock::backOffStep(0), B::spin);
-  EXPECT_EQ(base::SpinLock::backOffStep(59), B::spin);
-  EXPECT_EQ(base::SpinLock::backOffStep(60), B::yield);
-  EXPECT_EQ(base::SpinLock::backOffStep(89), B::yield);
-  EXPECT_EQ(base::SpinLock::backOffStep(90), B::sleep0);
-  EXPECT_EQ(base::SpinLock::backOffStep(104), B::sleep0);
-  EXPECT_EQ(base::SpinLock::backOffStep(105), B::sleep1);
-  unsigned attempt = 105;
-  base::SpinLock::backOff(attempt);
-  EXPECT_EQ(attempt, 0u);
-  base::SpinLock::backOff(attempt);
-  EXPECT_EQ(attempt, 1u);
-}
-
 TEST(SpinLock, ExcludesUnderContention) {
   base::SpinLock lock;
   long counter = 0;
-  std::vector<std::thread> threads;
-  for (int t = 0; t < 4; ++t) {
-    threads.emplace_back([&] {
-      for (int i = 0; i < 20000; ++i) {
-        lock.lock();
-        ++counter;
-        lock.unlock();
-      }
-    });
-  }
-  for (auto& thread : threads) thread.join();
+  inParallel(4, [&] {
+    for (int i = 0; i < 20000; ++i) {
+      lock.lock();
+      ++counter;
+      lock.unlock();
+    }
+  });
   EXPECT_EQ(counter, 80000);
 }
 

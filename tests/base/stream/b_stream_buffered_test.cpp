@@ -2,6 +2,7 @@
 #include "b_stream.h"
 #include "log_capture.h"
 #include "test_streams.h"
+#include "thrown.h"
 
 #include <gtest/gtest.h>
 
@@ -9,6 +10,8 @@
 
 namespace {
 
+using stream_tests::thrown;
+using stream_tests::thrownText;
 using testing_support::fileLikeStream;
 using testing_support::FileLikeWorker;
 using testing_support::LogCapture;
@@ -20,13 +23,10 @@ std::string pattern(std::size_t size) {
   return data;
 }
 
-TEST(BufReadStream, InMemorySourceIsReturnedAsItIs) {
+TEST(BufReadStream, CapabilitiesFollowTheSource) {
+  // Data in memory gets no buffer, so buffers never stack up; a size only where the source has one.
   base::Stream memory = base::memStream("abc", 3);
   EXPECT_EQ(base::bufReadStream(memory, 0, 64).worker(), memory.worker());
-}
-
-TEST(BufReadStream, CapabilitiesFollowTheSource) {
-  // A size only where the source has one; never in memory, so buffers never stack up.
   EXPECT_TRUE(base::bufReadStream(fileLikeStream("x"), 0, 64).has(base::capSize));
   EXPECT_FALSE(base::bufReadStream(fileLikeStream("x", base::capRead), 0, 64).has(base::capSize));
   EXPECT_FALSE(base::bufReadStream(fileLikeStream("x"), 0, 64).has(base::capInMemory));
@@ -48,33 +48,30 @@ TEST(BufReadStream, ReadsAcrossRefillsWithFewSourceCalls) {
   EXPECT_TRUE(buffered.isEOF());
 }
 
-TEST(BufReadStream, HistoryAllowsShortBackwardMovesAfterARefill) {
-  const std::string data = pattern(300);
-  auto* worker = new FileLikeWorker(data);
-  base::Stream buffered = base::bufReadStream(base::Stream::adopt(worker), 0, 128);
-  char buffer[130];
-  ASSERT_EQ(buffered.read(buffer, 100), 100u);
-  ASSERT_EQ(buffered.read(buffer, 50), 50u);  // crosses the buffer's edge: a refill
-  const int readsBefore = worker->reads;
-  EXPECT_EQ(buffered.setPosition(-60, base::seekCurrent), 90);
-  ASSERT_EQ(buffered.read(buffer, 60), 60u);
-  EXPECT_EQ(std::string(buffer, 60), data.substr(90, 60));
-  EXPECT_EQ(worker->reads, readsBefore);
+// Stepping back `back` bytes and reading them again is served from the buffer's history.
+void expectRereadWithoutSourceAccess(base::Stream& buffered, const FileLikeWorker& worker, const std::string& data,
+                                     std::uint32_t back) {
+  const int readsBefore = worker.reads;
+  const std::int64_t position = buffered.getPosition();
+  EXPECT_EQ(buffered.setPosition(-std::int64_t(back), base::seekCurrent), position - back);
+  std::string again(back, '\0');
+  ASSERT_EQ(buffered.read(again.data(), back), back);
+  EXPECT_EQ(again, data.substr(position - back, back));
+  EXPECT_EQ(worker.reads, readsBefore);
 }
 
-TEST(BufReadStream, LargeReadsBypassTheBufferAndKeepHistory) {
+TEST(BufReadStream, HistoryAllowsShortBackwardMovesAfterARefillAndALargeRead) {
   const std::string data = pattern(5000);
   auto* worker = new FileLikeWorker(data);
-  base::Stream buffered = base::bufReadStream(base::Stream::adopt(worker), 0, 256);
-  std::string big(4000, '\0');
-  ASSERT_EQ(buffered.read(big.data(), 4000), 4000u);
-  EXPECT_EQ(big, data.substr(0, 4000));
-  const int readsBefore = worker->reads;
-  buffered.setPosition(-10, base::seekCurrent);
-  char tail[10];
-  ASSERT_EQ(buffered.read(tail, 10), 10u);
-  EXPECT_EQ(std::string(tail, 10), data.substr(3990, 10));
-  EXPECT_EQ(worker->reads, readsBefore);
+  base::Stream buffered = base::bufReadStream(base::Stream::adopt(worker), 0, 128);
+  std::string got(4000, '\0');
+  ASSERT_EQ(buffered.read(got.data(), 100), 100u);
+  ASSERT_EQ(buffered.read(got.data(), 50), 50u);  // crosses the buffer's edge: a refill
+  expectRereadWithoutSourceAccess(buffered, *worker, data, 60);
+  // Larger than the buffer: read around it, and its tail becomes the history.
+  ASSERT_EQ(buffered.read(got.data(), 4000), 4000u);
+  EXPECT_EQ(got, data.substr(150, 4000));
+  expectRereadWithoutSourceAccess(buffered, *worker, data, 10);
 }
 
 TEST(BufReadStream, PositionsCountFromTheSourcePositionAndFarSeeksMoveIt) {
@@ -110,13 +107,9 @@ TEST(BufReadStream, BadOriginsThrow) {
   base::Stream buffered = base::bufReadStream(fileLikeStream("abc"), 0, 64);
   EXPECT_THROW(buffered.setPosition(0, 3), base::switch_exception);
   base::Stream unsized = base::bufReadStream(fileLikeStream("abc", base::capRead | base::capPosition), 0, 64);
-  try {
-    unsized.setPosition(0, base::seekEnd);
-    FAIL();
-  } catch (const base::unsupported_interface& error) {
-    EXPECT_STREQ(error.interfaceName(), "Stream::getSize");
-    EXPECT_STREQ(error.function(), "base::bufSetPosition");
-  }
+  const auto error = thrown<base::unsupported_interface>([&] { unsized.setPosition(0, base::seekEnd); });
+  ASSERT_TRUE(error);
+  EXPECT_STREQ(error->interfaceName(), "Stream::getSize");
 }
 
 TEST(BufReadStream, SourceDoesNotThrowInsideTheBufferAndComesBackWithItsFlags) {
@@ -163,15 +156,17 @@ TEST(CharStream, OneBytePerReadAndPushbackAtABufferEdge) {
   EXPECT_EQ(chars.read(&byte, 1), 0u);
 }
 
+// A destination that takes `room` bytes in all and at most `perCall` bytes per write.
 struct Limited : FileLikeWorker {
-  Limited(std::uint32_t room) : FileLikeWorker("", base::capWrite | base::capSize), room(room) {}
+  Limited(std::uint32_t room, std::uint32_t perCall = 1000)
+      : FileLikeWorker("", base::capWrite | base::capSize), room(room), perCall(perCall) {}
   std::uint32_t write(const void* data, std::uint32_t count) override {
-    const std::uint32_t n = std::min(count, room - static_cast<std::uint32_t>(written.size()));
+    const std::uint32_t n = std::min({count, perCall, room - static_cast<std::uint32_t>(written.size())});
     written.append(static_cast<const char*>(data), n);
     return n;
   }
   std::int64_t getSize() override { return static_cast<std::int64_t>(written.size()); }
-  std::uint32_t room;
+  std::uint32_t room, perCall;
   std::string written;
 };
 
@@ -194,25 +189,12 @@ TEST(BufWriteStream, ShortWriteThrowsWhenTheDestinationAskedForIt) {
   base::Stream destination = base::Stream::adopt(new Limited(5));
   destination.flags = base::throwOnShortWrite;
   base::Stream buffered = base::bufWriteStream(destination, 4, "out");
-  try {
-    buffered.write("0123456789", 10);
-    FAIL();
-  } catch (const base::exception& error) {
-    EXPECT_STREQ(error.what(), "stream 'file-like': trying to write 6 bytes, written 1 bytes");
-  }
+  EXPECT_EQ(thrownText([&] { buffered.write("0123456789", 10); }),
+            "stream 'file-like': trying to write 6 bytes, written 1 bytes");
 }
 
-// A destination that takes at most `room` bytes per call.
-struct Trickle : Limited {
-  Trickle(std::uint32_t perCall) : Limited(1000), perCall(perCall) {}
-  std::uint32_t write(const void* data, std::uint32_t count) override {
-    return Limited::write(data, std::min(count, perCall));
-  }
-  std::uint32_t perCall;
-};
-
 TEST(BufWriteStream, BytesTakenBeforeAShortWriteAreNotWrittenAgain) {
-  auto* trickle = new Trickle(2);
+  auto* trickle = new Limited(1000, 2);
   base::Stream destination = base::Stream::adopt(trickle);
   destination.flags = base::throwOnShortWrite;
   base::Stream buffered = base::bufWriteStream(destination, 8);
