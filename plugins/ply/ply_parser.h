@@ -15,6 +15,12 @@ namespace ply {
 /// `beginInstance(i)` before its first property; then `plyProperty` once per property
 /// instance, with the values valid only during the call. The reader is a template over the
 /// receiver so that the per-property call is inlined, never a virtual call.
+///
+/// A receiver may also have `bool plyPlan(const Element&, ElementPlan&)`: asked after
+/// plyElement said yes, it may fill a plan that tells where each property goes (see
+/// ply_plan.h); the reader then moves whole columns into place and calls plyProperty only
+/// for the properties the plan leaves to it. False, or a plan that does not cover every
+/// property, keeps the per-property calls.
 template <class R>
 concept Receiver = requires(R& receiver, const Element& element, const Property& property, const ValueArray& values,
                             std::uint32_t index) {
@@ -31,7 +37,8 @@ bool parseHeader(Header& header, base::Stream& stream);
 
 }  // namespace ply
 
-#include "ply_body.h"
+#include "ply_ascii_body.h"
+#include "ply_binary_body.h"
 
 namespace ply {
 

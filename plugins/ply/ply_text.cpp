@@ -2,8 +2,10 @@
 
 #include <algorithm>
 #include <charconv>
+#include <cmath>
 #include <cstring>
 #include <limits>
+#include <type_traits>
 
 namespace ply {
 namespace {
@@ -46,8 +48,63 @@ bool tooLarge(std::string_view number) {
   return magnitude > 0;
 }
 
+// The common forms, [sign] digits [. digits] [e|E [sign] digits] filling the whole word, with
+// a mantissa below 2^53 and a power of ten up to 22: the mantissa and the power are exact
+// doubles, so one multiplication or division gives the correctly rounded double. For a
+// double that is the answer; a float is rounded from it, which is right unless the double
+// lies exactly halfway between two floats. False leaves the word to from_chars.
+template <class T>
+bool parseRealFast(std::string_view word, T& result) {
+  static constexpr double powers[] = {1e0,  1e1,  1e2,  1e3,  1e4,  1e5,  1e6,  1e7,  1e8,  1e9,  1e10, 1e11,
+                                      1e12, 1e13, 1e14, 1e15, 1e16, 1e17, 1e18, 1e19, 1e20, 1e21, 1e22};
+  constexpr std::uint64_t mantissaLimit = (std::uint64_t(1) << 53) / 10 - 1;
+  const char* at = word.data();
+  const char* const end = at + word.size();
+  const bool negative = at != end && *at == '-';
+  if (at != end && (*at == '-' || *at == '+')) ++at;
+  std::uint64_t mantissa = 0;
+  int exponent = 0;
+  bool digits = false;
+  for (; at != end && *at >= '0' && *at <= '9'; ++at, digits = true) {
+    if (mantissa > mantissaLimit) return false;
+    mantissa = mantissa * 10 + static_cast<std::uint64_t>(*at - '0');
+  }
+  if (at != end && *at == '.') {
+    for (++at; at != end && *at >= '0' && *at <= '9'; ++at, digits = true, --exponent) {
+      if (mantissa > mantissaLimit) return false;
+      mantissa = mantissa * 10 + static_cast<std::uint64_t>(*at - '0');
+    }
+  }
+  if (!digits) return false;
+  if (at != end && (*at == 'e' || *at == 'E')) {
+    ++at;
+    const bool negativeExponent = at != end && *at == '-';
+    if (at != end && (*at == '-' || *at == '+')) ++at;
+    if (at == end) return false;
+    int value = 0;
+    for (; at != end && *at >= '0' && *at <= '9' && value < 1000; ++at) value = value * 10 + (*at - '0');
+    exponent += negativeExponent ? -value : value;
+  }
+  if (at != end || exponent < -22 || exponent > 22) return false;
+  double magnitude = static_cast<double>(mantissa);
+  magnitude = exponent < 0 ? magnitude / powers[-exponent] : magnitude * powers[exponent];
+  if constexpr (std::is_same_v<T, float>) {
+    const float nearest = static_cast<float>(magnitude);
+    if (static_cast<double>(nearest) != magnitude) {
+      const float other =
+          std::nextafter(nearest, static_cast<float>(static_cast<double>(nearest) < magnitude ? INFINITY : -INFINITY));
+      if ((static_cast<double>(nearest) + static_cast<double>(other)) / 2 == magnitude) return false;
+    }
+    result = negative ? -nearest : nearest;
+  } else {
+    result = negative ? -magnitude : magnitude;
+  }
+  return true;
+}
+
 template <class T>
 T parseReal(std::string_view word) {
+  if (T fast; parseRealFast(word, fast)) return fast;
   const bool negative = !word.empty() && word.front() == '-';
   if (!word.empty() && (word.front() == '-' || word.front() == '+')) word.remove_prefix(1);
   if (word.empty()) return T(0);
@@ -104,34 +161,54 @@ std::string_view WordReader::read(ByteWindow& window) {
   return m_copy;
 }
 
+template <DataType T>
+detail::Held<T> parseAsciiHeld(std::string_view word) {
+  using H = detail::Held<T>;
+  if constexpr (std::is_floating_point_v<H>) {
+    return parseReal<H>(word);
+  } else if constexpr (std::is_signed_v<H>) {
+    const bool negative = !word.empty() && word.front() == '-';
+    if (!word.empty() && (word.front() == '-' || word.front() == '+')) word.remove_prefix(1);
+    const std::uint32_t digits = leadingDigits(word);
+    return static_cast<std::int32_t>(negative ? 0u - digits : digits);
+  } else {
+    // "+3" is 3 (read as 0 it would also shift every later value after a list count);
+    // a minus sign still gives 0.
+    if (!word.empty() && word.front() == '+') word.remove_prefix(1);
+    return leadingDigits(word);
+  }
+}
+
+template detail::Held<DataType::int8> parseAsciiHeld<DataType::int8>(std::string_view);
+template detail::Held<DataType::uint8> parseAsciiHeld<DataType::uint8>(std::string_view);
+template detail::Held<DataType::int16> parseAsciiHeld<DataType::int16>(std::string_view);
+template detail::Held<DataType::uint16> parseAsciiHeld<DataType::uint16>(std::string_view);
+template detail::Held<DataType::int32> parseAsciiHeld<DataType::int32>(std::string_view);
+template detail::Held<DataType::uint32> parseAsciiHeld<DataType::uint32>(std::string_view);
+template detail::Held<DataType::float32> parseAsciiHeld<DataType::float32>(std::string_view);
+template detail::Held<DataType::float64> parseAsciiHeld<DataType::float64>(std::string_view);
+
 Value parseAsciiValue(std::string_view word, DataType type) {
   Value value;
-  value.d = 0;
   switch (type) {
     case DataType::int8:
     case DataType::int16:
-    case DataType::int32: {
-      const bool negative = !word.empty() && word.front() == '-';
-      if (!word.empty() && (word.front() == '-' || word.front() == '+')) word.remove_prefix(1);
-      const std::uint32_t digits = leadingDigits(word);
-      value.i = static_cast<std::int32_t>(negative ? 0u - digits : digits);
+    case DataType::int32:
+      value.i = parseAsciiHeld<DataType::int32>(word);
       break;
-    }
     case DataType::uint8:
     case DataType::uint16:
     case DataType::uint32:
-      // "+3" is 3 (read as 0 it would also shift every later value after a list count);
-      // a minus sign still gives 0.
-      if (!word.empty() && word.front() == '+') word.remove_prefix(1);
-      value.u = leadingDigits(word);
+      value.u = parseAsciiHeld<DataType::uint32>(word);
       break;
     case DataType::float32:
-      value.f = parseReal<float>(word);
+      value.f = parseAsciiHeld<DataType::float32>(word);
       break;
     case DataType::float64:
-      value.d = parseReal<double>(word);
+      value.d = parseAsciiHeld<DataType::float64>(word);
       break;
     case DataType::none:
+      value.d = 0;
       break;
   }
   return value;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "ply_columns.h"
 #include "ply_value.h"
 #include "ply_window.h"
 
@@ -39,6 +40,11 @@ class WordReader {
  private:
   base::string m_copy;
 };
+
+/// The value of an ASCII word read as type T, held as ply::Value holds it; see
+/// parseAsciiValue.
+template <DataType T>
+detail::Held<T> parseAsciiHeld(std::string_view word);
 
 /// The value of an ASCII word read as `type`: integers from their leading digits after an
 /// optional sign (a minus sign gives 0 for the unsigned types), floats as the

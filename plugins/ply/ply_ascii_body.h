@@ -1,0 +1,206 @@
+#pragma once
+
+// The ASCII body reader: per property instance through the receiver, or, where the receiver
+// answers an element with a plan, each word parsed straight into its target.
+
+#include "ply_body.h"
+
+#include <cstdint>
+#include <cstring>
+
+namespace ply::detail {
+
+/// Parses a word as a value of one type and stores it by one conversion.
+using WordFunction = void (*)(std::string_view word, std::byte* target);
+
+template <DataType T, Conversion C>
+void storeWord(std::string_view word, std::byte* target) {
+  const auto stored = convertHeld<T, C>(parseAsciiHeld<T>(word));
+  std::memcpy(target, &stored, sizeof stored);
+}
+
+inline WordFunction wordFunction(DataType type, Conversion conversion) {
+  return forTypeAndConversion(type, conversion,
+                              []<DataType T, Conversion C>() -> WordFunction { return storeWord<T, C>; });
+}
+
+class AsciiBody {
+ public:
+  explicit AsciiBody(ByteWindow& window) : m_window(window) {}
+
+  /// Reads every element; false when the data ended early. After the end, later elements
+  /// are still announced to the receiver and reported as empty.
+  template <class R>
+  bool read(const Header& header, R& receiver) {
+    for (const Element& element : header.elements) {
+      const bool deliver = receiver.plyElement(element);
+      if (element.count == 0 || element.properties.empty()) continue;
+      if (m_ended) {
+        warnEndedEarly(element, 0);
+        continue;
+      }
+      if (deliver && askPlan(receiver, element, m_plan)) {
+        readPlanned(element, receiver);
+        m_report.finish(element);
+      } else {
+        readInstances(element, [&](std::uint32_t i) {
+          if (deliver) receiver.beginInstance(i);
+          return readInstance(element, deliver, receiver);
+        });
+      }
+    }
+    return !m_ended;
+  }
+
+ private:
+  enum class Status { ok, invalid, ended };
+
+  // An instance that cannot be read has its line skipped; the end of the data ends the body.
+  template <class ReadOne>
+  void readInstances(const Element& element, ReadOne readOne) {
+    for (std::uint32_t i = 0; i < element.count; ++i) {
+      const Status status = readOne(i);
+      if (status == Status::ended) {
+        m_ended = true;
+        warnEndedEarly(element, i);
+        return;
+      }
+      if (status == Status::invalid) {
+        base::log().message(base::logScene, base::logWarning,
+                            "Unable to parse property instance. Skipping this element instance");
+        skipLine(m_window);
+      }
+    }
+  }
+
+  template <class R>
+  Status readInstance(const Element& element, bool deliver, R& receiver) {
+    for (const Property& property : element.properties) {
+      std::string_view word;
+      if (const Status status = nextWord(word); status != Status::ok) return status;
+      if (!property.isList) {
+        if (!deliver) continue;
+        m_values.resize(1);
+        m_values[0] = parseAsciiValue(word, property.type);
+      } else if (const Status status = readList(property, word, deliver); status != Status::ok) {
+        return status;
+      }
+      if (deliver) receiver.plyProperty(element, property, m_values);
+    }
+    return Status::ok;
+  }
+
+  // The items are appended as their words arrive, so a count from the file never sizes the
+  // array on its own.
+  Status readList(const Property& property, std::string_view countWord, bool deliver) {
+    const std::uint32_t count = listCount(parseAsciiValue(countWord, property.countType), property.countType);
+    m_values.clear();
+    for (std::uint32_t k = 0; k < count; ++k) {
+      std::string_view word;
+      if (const Status status = nextWord(word); status != Status::ok) return status;
+      if (deliver) base::append(m_values, parseAsciiValue(word, property.type));
+    }
+    return Status::ok;
+  }
+
+  // A value's word; a "comment" line where a value is expected is skipped once. The first
+  // byte decides before the whole word is compared, as numbers never start with 'c'.
+  Status nextWord(std::string_view& word) {
+    word = m_words.read(m_window);
+    if (!word.empty() && word.front() == 'c' && word == "comment") {
+      skipLine(m_window);
+      word = m_words.read(m_window);
+    }
+    if (!word.empty()) return Status::ok;
+    return m_window.peek() < 0 ? Status::ended : Status::invalid;
+  }
+
+  // ---- Through a plan.
+
+  template <class R>
+  void readPlanned(const Element& element, R& receiver) {
+    m_store.clear();
+    for (std::size_t p = 0; p < element.properties.size(); ++p) {
+      const PropertyPlan& plan = m_plan.properties[p];
+      const Conversion conversion = plan.kind == PropertyPlan::Kind::indices ? Conversion::toIndex : plan.conversion;
+      base::append(m_store, wordFunction(element.properties[p].type, conversion));
+    }
+    PlanTargets targets(m_plan, element.count, m_window.remaining().has_value());
+    const bool delivers = m_plan.delivers();
+    readInstances(element, [&](std::uint32_t i) {
+      targets.reach(std::uint64_t(i) + 1);
+      if (delivers) receiver.beginInstance(i);
+      return readPlannedInstance(element, i, targets, receiver);
+    });
+  }
+
+  template <class R>
+  Status readPlannedInstance(const Element& element, std::uint32_t i, PlanTargets& targets, R& receiver) {
+    for (std::size_t p = 0; p < element.properties.size(); ++p) {
+      const Property& property = element.properties[p];
+      const PropertyPlan& plan = m_plan.properties[p];
+      std::string_view word;
+      if (const Status status = nextWord(word); status != Status::ok) return status;
+      if (plan.kind == PropertyPlan::Kind::scalar) {
+        m_store[p](word, targets.at(plan.array, i, plan.offset));
+        continue;
+      }
+      const Status status = property.isList
+                                ? readPlannedList(element, property, plan, m_store[p], word, i, targets, receiver)
+                                : deliverScalar(element, property, plan, word, receiver);
+      if (status != Status::ok) return status;
+    }
+    return Status::ok;
+  }
+
+  template <class R>
+  Status deliverScalar(const Element& element, const Property& property, const PropertyPlan& plan,
+                       std::string_view word, R& receiver) {
+    if (plan.kind != PropertyPlan::Kind::deliver) return Status::ok;
+    m_values.resize(1);
+    m_values[0] = parseAsciiValue(word, property.type);
+    receiver.plyProperty(element, property, m_values);
+    return Status::ok;
+  }
+
+  template <class R>
+  Status readPlannedList(const Element& element, const Property& property, const PropertyPlan& plan, WordFunction store,
+                         std::string_view countWord, std::uint32_t i, PlanTargets& targets, R& receiver) {
+    const std::uint32_t count = listCount(parseAsciiValue(countWord, property.countType), property.countType);
+    const bool indices = plan.kind == PropertyPlan::Kind::indices && count <= m_plan.sinks[plan.sink].maxLength;
+    const bool values = plan.kind == PropertyPlan::Kind::valueList && count == plan.length;
+    if (!indices && !values) {
+      const bool deliver = plan.kind != PropertyPlan::Kind::skip;
+      if (const Status status = readList(property, countWord, deliver); status != Status::ok) return status;
+      if (deliver) receiver.plyProperty(element, property, m_values);
+      return Status::ok;
+    }
+    // Kept aside until the list is complete, as a delivered list would be; grown as the
+    // words arrive.
+    m_items.clear();
+    for (std::uint32_t k = 0; k < count; ++k) {
+      std::string_view word;
+      if (const Status status = nextWord(word); status != Status::ok) return status;
+      base::reserveForAppend(m_items, 1);
+      m_items.emplace_back();
+      store(word, reinterpret_cast<std::byte*>(&m_items.back()));
+    }
+    if (indices) {
+      storeIndexList(m_plan.sinks[plan.sink], m_items.data(), count, m_report);
+    } else {
+      std::memcpy(targets.at(plan.array, i, plan.offset), m_items.data(), std::size_t(count) * 4);
+    }
+    return Status::ok;
+  }
+
+  ByteWindow& m_window;
+  WordReader m_words;
+  ValueArray m_values;
+  bool m_ended = false;
+  ElementPlan m_plan;
+  base::vector<WordFunction> m_store;
+  base::vector<std::uint32_t> m_items;
+  BadIndexReport m_report;
+};
+
+}  // namespace ply::detail
