@@ -1,5 +1,7 @@
 #include "b_alloc.h"
 
+#include "b_platform.h"
+
 #include <cstdio>
 #include <cstdlib>
 
@@ -15,7 +17,7 @@ namespace {
 
 void* StdAllocPolicy::allocateBytes(std::size_t size, const char*, int, const char*, std::uint32_t) {
   // malloc(0) may answer null; a zero-byte request still gets a unique block.
-  void* block = std::malloc(size ? size : 1);
+  void* block = platform::allocateBytes(size ? size : 1);
   if (!block) outOfMemory(size);
   return block;
 }

@@ -5,6 +5,7 @@
 
 #include "b_containers.h"
 
+#include <cstddef>
 #include <cstdint>
 #include <ctime>
 
@@ -15,6 +16,11 @@ base::string captureStack(int skip);
 
 /// The system's text for an error code as the system gives it; empty for an unknown code.
 base::string systemErrorText(std::uint32_t code);
+
+/// A block of `size` bytes that std::free releases; null when there is no memory. Large
+/// blocks (a mesh's arrays) may be placed where the system can back them with large pages,
+/// so that filling them costs a page fault per 2 MiB instead of per 4 KiB.
+void* allocateBytes(std::size_t size);
 
 /// The local calendar time of `time`; thread-safe.
 std::tm localTime(std::time_t time);

@@ -2,6 +2,7 @@
 
 #include <execinfo.h>
 #include <sched.h>
+#include <sys/mman.h>
 
 #include <cstdlib>
 #include <cstring>
@@ -30,6 +31,17 @@ base::string captureStack(int skip) {
     text += '\n';
   }
   return text;
+}
+
+void* allocateBytes(std::size_t size) {
+  constexpr std::size_t largePage = std::size_t(2) << 20;
+  if (size < 2 * largePage) return std::malloc(size);
+  if (size > SIZE_MAX - largePage) return nullptr;
+  const std::size_t rounded = (size + largePage - 1) & ~(largePage - 1);
+  void* block = std::aligned_alloc(largePage, rounded);
+  // Only advice: where the system has no large pages to give, the block works as it is.
+  if (block) madvise(block, rounded, MADV_HUGEPAGE);
+  return block;
 }
 
 std::tm localTime(std::time_t time) {

@@ -3,6 +3,7 @@
 #include <windows.h>
 
 #include <cstdio>
+#include <cstdlib>
 
 namespace base::platform {
 
@@ -36,6 +37,8 @@ base::string captureStack(int skip) {
   }
   return text;
 }
+
+void* allocateBytes(std::size_t size) { return std::malloc(size); }
 
 std::tm localTime(std::time_t time) {
   std::tm local{};

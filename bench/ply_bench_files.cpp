@@ -20,20 +20,24 @@ using File = std::unique_ptr<std::FILE, int (*)(std::FILE*)>;
 
 const char* formatWord(Encoding encoding) {
   switch (encoding) {
-    case Encoding::ascii: return "ascii";
-    case Encoding::little: return "binary_little_endian";
-    case Encoding::big: return "binary_big_endian";
+    case Encoding::ascii:
+      return "ascii";
+    case Encoding::little:
+      return "binary_little_endian";
+    case Encoding::big:
+      return "binary_big_endian";
   }
   return "";
 }
 
 // Writes values in the file's encoding.
 class Writer {
-public:
+ public:
   Writer(std::FILE* file, Encoding encoding) : m_file(file), m_encoding(encoding) {}
 
   void real(float value) {
-    if (m_encoding == Encoding::ascii) return text(fmt::format("{}", value));
+    // Nine significant digits, as other tools write floats.
+    if (m_encoding == Encoding::ascii) return text(fmt::format("{:.9g}", value));
     raw(std::bit_cast<std::uint32_t>(value), 4);
   }
   void integer(std::uint32_t value, int bytes, bool isSigned = false) {
@@ -50,7 +54,7 @@ public:
     }
   }
 
-private:
+ private:
   void text(const std::string& word) {
     m_line += word;
     m_line += ' ';
@@ -114,8 +118,7 @@ void writeCloud(std::FILE* file, Encoding encoding) {
 std::string plyFile(Shape shape, Encoding encoding) {
   const std::filesystem::path folder = std::filesystem::temp_directory_path() / "meshport-bench";
   std::filesystem::create_directories(folder);
-  const std::string name =
-      fmt::format("{}_{}.ply", shape == Shape::mesh ? "mesh" : "cloud", formatWord(encoding));
+  const std::string name = fmt::format("{}_{}_9g.ply", shape == Shape::mesh ? "mesh" : "cloud", formatWord(encoding));
   const std::filesystem::path path = folder / name;
   if (std::filesystem::exists(path)) return path.string();
   const std::filesystem::path partial = folder / (name + ".partial");

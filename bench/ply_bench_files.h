@@ -6,7 +6,8 @@ namespace bench {
 
 /// The PLY files the benchmarks read: a textured, coloured triangle mesh (1,000,000 vertices,
 /// 2,000,000 triangles) and a coloured point cloud (2,000,000 points), each in the three
-/// encodings. Written once into a folder under the system's temporary directory.
+/// encodings, ASCII floats with nine significant digits. Written once into a folder under
+/// the system's temporary directory.
 enum class Shape { mesh, cloud };
 enum class Encoding { ascii, little, big };
 

@@ -7,6 +7,7 @@
 
 #include <algorithm>
 #include <cstdint>
+#include <optional>
 
 namespace ply::detail {
 
@@ -174,6 +175,7 @@ class BinaryBody {
   template <class R>
   bool readPlanned(const Element& element, const BinaryPlan& layout, R& receiver) {
     prepareSteps(element);
+    m_elementCount = element.count;
     PlanTargets targets(m_plan, element.count, m_window.remaining().has_value());
     const bool delivers = m_plan.delivers();
     if (layout.recordSize > 0) return readPlannedRecords(element, layout, targets, delivers, receiver);
@@ -275,12 +277,44 @@ class BinaryBody {
     if (!records) return 0;
     const std::uint64_t limit =
         std::min<std::uint64_t>(element.count - first, static_cast<std::uint64_t>(m_window.end() - records) / size);
-    std::uint64_t run = 1;
-    while (run < limit && std::memcmp(records + run * size + before, records + before, countSize) == 0) ++run;
+    const std::uint64_t run = equalCounts(records + before, size, limit, countSize);
     targets.reach(first + run);
     storeUniformRun(records, size, first, run, list, count, targets);
     m_window.advance(run * size);
     return run;
+  }
+
+  // How many of the `limit` records from `counts` on have the first one's count bytes.
+  static std::uint64_t equalCounts(const std::uint8_t* counts, std::uint64_t size, std::uint64_t limit,
+                                   std::uint32_t countSize) {
+    const auto same = [&]<std::uint32_t Bytes>() {
+      std::uint64_t run = 1;
+      while (run < limit && std::memcmp(counts + run * size, counts, Bytes) == 0) ++run;
+      return run;
+    };
+    switch (countSize) {
+      case 1:
+        return same.template operator()<1>();
+      case 2:
+        return same.template operator()<2>();
+      case 4:
+        return same.template operator()<4>();
+      default:
+        return same.template operator()<8>();
+    }
+  }
+
+  // Where the stream's size shows how much data is left, an index sink is given room for the
+  // rest of the element at once, in the lengths of the run that starts now, so that it is not
+  // copied over and over as it grows.
+  void reserveAhead(const IndexSink& sink, std::uint64_t instancesLeft, std::uint32_t count, std::uint32_t itemSize) {
+    const std::optional<std::uint64_t> bytesLeft = m_window.remaining();
+    if (!bytesLeft) return;
+    const std::uint64_t items = std::min(instancesLeft * count, *bytesLeft / itemSize + count);
+    if (sink.indices->capacity() < sink.indices->size() + items) sink.indices->reserve(sink.indices->size() + items);
+    if (sink.listCounts && sink.listCounts->capacity() < sink.listCounts->size() + instancesLeft) {
+      sink.listCounts->reserve(sink.listCounts->size() + std::min(instancesLeft, *bytesLeft / itemSize + 1));
+    }
   }
 
   void storeUniformRun(const std::uint8_t* records, std::uint64_t size, std::uint64_t first, std::uint64_t run,
@@ -315,6 +349,7 @@ class BinaryBody {
       const IndexSink& sink = m_plan.sinks[plan.sink];
       base::vector<std::uint32_t>& indices = *sink.indices;
       const std::size_t start = indices.size();
+      if (indices.capacity() < start + run * count) reserveAhead(sink, m_elementCount - first, count, step.size);
       base::reserveForAppend(indices, run * count);
       indices.resize(start + run * count);
       auto* target = reinterpret_cast<std::byte*>(indices.data() + start);
@@ -394,6 +429,7 @@ class BinaryBody {
   base::vector<Step> m_steps;
   base::vector<std::uint32_t> m_items;
   BadIndexReport m_report;
+  std::uint64_t m_elementCount = 0;
 };
 
 }  // namespace ply::detail
