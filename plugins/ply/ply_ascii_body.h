@@ -19,10 +19,33 @@ void storeWord(std::string_view word, std::byte* target) {
   std::memcpy(target, &stored, sizeof stored);
 }
 
-inline WordFunction wordFunction(DataType type, Conversion conversion) {
-  return forTypeAndConversion(type, conversion,
-                              []<DataType T, Conversion C>() -> WordFunction { return storeWord<T, C>; });
+/// Parses the value at `at` in the window and stores it, for the common forms of words;
+/// null when the word must be read as a word instead (see parseAsciiFast).
+using FastFunction = const char* (*)(const char* at, const char* end, std::byte* target);
+
+template <DataType T, Conversion C>
+const char* storeFast(const char* at, const char* end, std::byte* target) {
+  Held<T> value{};
+  const char* stop = parseAsciiFast<T>(at, end, value);
+  if (stop) {
+    const auto stored = convertHeld<T, C>(value);
+    std::memcpy(target, &stored, sizeof stored);
+  }
+  return stop;
 }
+
+/// How one planned property's words are stored: straight from the window when they allow
+/// it, else word by word.
+struct WordStore {
+  FastFunction fast;
+  WordFunction word;
+
+  WordStore(DataType type, Conversion conversion)
+      : fast(forTypeAndConversion(type, conversion,
+                                  []<DataType T, Conversion C>() -> FastFunction { return storeFast<T, C>; })),
+        word(forTypeAndConversion(type, conversion,
+                                  []<DataType T, Conversion C>() -> WordFunction { return storeWord<T, C>; })) {}
+};
 
 class AsciiBody {
  public:
@@ -117,13 +140,30 @@ class AsciiBody {
 
   // ---- Through a plan.
 
+  // The next value, stored straight from the window when its word allows, else read as a
+  // word; "comment" lines and bytes that start no word take the word path.
+  Status storeNext(const WordStore& store, std::byte* target) {
+    const auto* cursor = reinterpret_cast<const char*>(m_window.cursor());
+    const auto* end = reinterpret_cast<const char*>(m_window.end());
+    const char* at = cursor;
+    while (at != end && isBlank(*at)) ++at;
+    if (const char* stop = store.fast(at, end, target)) {
+      m_window.advance(static_cast<std::size_t>(stop - cursor));
+      return Status::ok;
+    }
+    std::string_view word;
+    if (const Status status = nextWord(word); status != Status::ok) return status;
+    store.word(word, target);
+    return Status::ok;
+  }
+
   template <class R>
   void readPlanned(const Element& element, R& receiver) {
     m_store.clear();
     for (std::size_t p = 0; p < element.properties.size(); ++p) {
       const PropertyPlan& plan = m_plan.properties[p];
       const Conversion conversion = plan.kind == PropertyPlan::Kind::indices ? Conversion::toIndex : plan.conversion;
-      base::append(m_store, wordFunction(element.properties[p].type, conversion));
+      base::append(m_store, WordStore(element.properties[p].type, conversion));
     }
     PlanTargets targets(m_plan, element.count, m_window.remaining().has_value());
     const bool delivers = m_plan.delivers();
@@ -139,12 +179,14 @@ class AsciiBody {
     for (std::size_t p = 0; p < element.properties.size(); ++p) {
       const Property& property = element.properties[p];
       const PropertyPlan& plan = m_plan.properties[p];
-      std::string_view word;
-      if (const Status status = nextWord(word); status != Status::ok) return status;
       if (plan.kind == PropertyPlan::Kind::scalar) {
-        m_store[p](word, targets.at(plan.array, i, plan.offset));
+        if (const Status status = storeNext(m_store[p], targets.at(plan.array, i, plan.offset)); status != Status::ok) {
+          return status;
+        }
         continue;
       }
+      std::string_view word;
+      if (const Status status = nextWord(word); status != Status::ok) return status;
       const Status status = property.isList
                                 ? readPlannedList(element, property, plan, m_store[p], word, i, targets, receiver)
                                 : deliverScalar(element, property, plan, word, receiver);
@@ -164,8 +206,9 @@ class AsciiBody {
   }
 
   template <class R>
-  Status readPlannedList(const Element& element, const Property& property, const PropertyPlan& plan, WordFunction store,
-                         std::string_view countWord, std::uint32_t i, PlanTargets& targets, R& receiver) {
+  Status readPlannedList(const Element& element, const Property& property, const PropertyPlan& plan,
+                         const WordStore& store, std::string_view countWord, std::uint32_t i, PlanTargets& targets,
+                         R& receiver) {
     const std::uint32_t count = listCount(parseAsciiValue(countWord, property.countType), property.countType);
     const bool indices = plan.kind == PropertyPlan::Kind::indices && count <= m_plan.sinks[plan.sink].maxLength;
     const bool values = plan.kind == PropertyPlan::Kind::valueList && count == plan.length;
@@ -179,11 +222,11 @@ class AsciiBody {
     // words arrive.
     m_items.clear();
     for (std::uint32_t k = 0; k < count; ++k) {
-      std::string_view word;
-      if (const Status status = nextWord(word); status != Status::ok) return status;
       base::reserveForAppend(m_items, 1);
       m_items.emplace_back();
-      store(word, reinterpret_cast<std::byte*>(&m_items.back()));
+      if (const Status status = storeNext(store, reinterpret_cast<std::byte*>(&m_items.back())); status != Status::ok) {
+        return status;
+      }
     }
     if (indices) {
       storeIndexList(m_plan.sinks[plan.sink], m_items.data(), count, m_report);
@@ -198,7 +241,7 @@ class AsciiBody {
   ValueArray m_values;
   bool m_ended = false;
   ElementPlan m_plan;
-  base::vector<WordFunction> m_store;
+  base::vector<WordStore> m_store;
   base::vector<std::uint32_t> m_items;
   BadIndexReport m_report;
 };

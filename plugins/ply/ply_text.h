@@ -46,6 +46,13 @@ class WordReader {
 template <DataType T>
 detail::Held<T> parseAsciiHeld(std::string_view word);
 
+/// The value of type T at `at` when the word there has a common form (an optional sign,
+/// digits, for reals a point and an exponent) and ends in a blank before `end`: the end of
+/// the number, with `value` as parseAsciiHeld gives it. Null leaves the word to
+/// parseAsciiHeld (other forms, words that run to `end`, "comment").
+template <DataType T>
+const char* parseAsciiFast(const char* at, const char* end, detail::Held<T>& value);
+
 /// The value of an ASCII word read as `type`: integers from their leading digits after an
 /// optional sign (a minus sign gives 0 for the unsigned types), floats as the
 /// correctly rounded nearest value, "nan" and "inf"/"infinity" in any case as NaN and
