@@ -105,7 +105,7 @@ class AsciiBody {
         if (!deliver) continue;
         m_values.resize(1);
         m_values[0] = parseAsciiValue(word, property.type);
-      } else if (const Status status = readList(property, word, deliver); status != Status::ok) {
+      } else if (const Status status = readList(property, countOf(word, property), deliver); status != Status::ok) {
         return status;
       }
       if (deliver) receiver.plyProperty(element, property, m_values);
@@ -115,8 +115,7 @@ class AsciiBody {
 
   // The items are appended as their words arrive, so a count from the file never sizes the
   // array on its own.
-  Status readList(const Property& property, std::string_view countWord, bool deliver) {
-    const std::uint32_t count = listCount(parseAsciiValue(countWord, property.countType), property.countType);
+  Status readList(const Property& property, std::uint32_t count, bool deliver) {
     m_values.clear();
     for (std::uint32_t k = 0; k < count; ++k) {
       std::string_view word;
@@ -124,6 +123,10 @@ class AsciiBody {
       if (deliver) base::append(m_values, parseAsciiValue(word, property.type));
     }
     return Status::ok;
+  }
+
+  static std::uint32_t countOf(std::string_view word, const Property& property) {
+    return listCount(parseAsciiValue(word, property.countType), property.countType);
   }
 
   // A value's word; a "comment" line where a value is expected is skipped once. The first
@@ -160,10 +163,12 @@ class AsciiBody {
   template <class R>
   void readPlanned(const Element& element, R& receiver) {
     m_store.clear();
+    m_counts.clear();
     for (std::size_t p = 0; p < element.properties.size(); ++p) {
       const PropertyPlan& plan = m_plan.properties[p];
       const Conversion conversion = plan.kind == PropertyPlan::Kind::indices ? Conversion::toIndex : plan.conversion;
       base::append(m_store, WordStore(element.properties[p].type, conversion));
+      base::append(m_counts, WordStore(element.properties[p].countType, Conversion::toIndex));
     }
     PlanTargets targets(m_plan, element.count, m_window.remaining().has_value());
     const bool delivers = m_plan.delivers();
@@ -185,19 +190,17 @@ class AsciiBody {
         }
         continue;
       }
-      std::string_view word;
-      if (const Status status = nextWord(word); status != Status::ok) return status;
-      const Status status = property.isList
-                                ? readPlannedList(element, property, plan, m_store[p], word, i, targets, receiver)
-                                : deliverScalar(element, property, plan, word, receiver);
+      const Status status = property.isList ? readPlannedList(element, property, plan, p, i, targets, receiver)
+                                            : deliverScalar(element, property, plan, receiver);
       if (status != Status::ok) return status;
     }
     return Status::ok;
   }
 
   template <class R>
-  Status deliverScalar(const Element& element, const Property& property, const PropertyPlan& plan,
-                       std::string_view word, R& receiver) {
+  Status deliverScalar(const Element& element, const Property& property, const PropertyPlan& plan, R& receiver) {
+    std::string_view word;
+    if (const Status status = nextWord(word); status != Status::ok) return status;
     if (plan.kind != PropertyPlan::Kind::deliver) return Status::ok;
     m_values.resize(1);
     m_values[0] = parseAsciiValue(word, property.type);
@@ -206,15 +209,18 @@ class AsciiBody {
   }
 
   template <class R>
-  Status readPlannedList(const Element& element, const Property& property, const PropertyPlan& plan,
-                         const WordStore& store, std::string_view countWord, std::uint32_t i, PlanTargets& targets,
-                         R& receiver) {
-    const std::uint32_t count = listCount(parseAsciiValue(countWord, property.countType), property.countType);
+  Status readPlannedList(const Element& element, const Property& property, const PropertyPlan& plan, std::size_t p,
+                         std::uint32_t i, PlanTargets& targets, R& receiver) {
+    // A list count is the low 32 bits of its integer, as the index conversion stores it.
+    std::uint32_t count = 0;
+    if (const Status status = storeNext(m_counts[p], reinterpret_cast<std::byte*>(&count)); status != Status::ok) {
+      return status;
+    }
     const bool indices = plan.kind == PropertyPlan::Kind::indices && count <= m_plan.sinks[plan.sink].maxLength;
     const bool values = plan.kind == PropertyPlan::Kind::valueList && count == plan.length;
     if (!indices && !values) {
       const bool deliver = plan.kind != PropertyPlan::Kind::skip;
-      if (const Status status = readList(property, countWord, deliver); status != Status::ok) return status;
+      if (const Status status = readList(property, count, deliver); status != Status::ok) return status;
       if (deliver) receiver.plyProperty(element, property, m_values);
       return Status::ok;
     }
@@ -224,7 +230,8 @@ class AsciiBody {
     for (std::uint32_t k = 0; k < count; ++k) {
       base::reserveForAppend(m_items, 1);
       m_items.emplace_back();
-      if (const Status status = storeNext(store, reinterpret_cast<std::byte*>(&m_items.back())); status != Status::ok) {
+      if (const Status status = storeNext(m_store[p], reinterpret_cast<std::byte*>(&m_items.back()));
+          status != Status::ok) {
         return status;
       }
     }
@@ -242,6 +249,7 @@ class AsciiBody {
   bool m_ended = false;
   ElementPlan m_plan;
   base::vector<WordStore> m_store;
+  base::vector<WordStore> m_counts;  ///< a list's count; unused for scalars
   base::vector<std::uint32_t> m_items;
   BadIndexReport m_report;
 };
