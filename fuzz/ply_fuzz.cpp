@@ -21,6 +21,48 @@ struct Touch {
   }
 };
 
+// Plans every element: scalars side by side in one record, by a conversion that depends on
+// their position; index lists to a sink with a range check; other lists of three to a
+// second array. What no plan covers is touched as above.
+struct Planner : Touch {
+  std::vector<float> scalars;
+  std::vector<float> triples;
+  base::vector<std::uint32_t> indices;
+  base::vector<std::uint16_t> counts;
+  std::uint32_t vertexCount = ply::IndexSink::noRangeCheck;
+
+  bool plyElement(const ply::Element& element) {
+    if (element.semantic == ply::ElementSemantic::vertex) vertexCount = element.count;
+    return true;
+  }
+  bool plyPlan(const ply::Element& element, ply::ElementPlan& plan) {
+    const auto width = static_cast<std::uint32_t>(element.properties.size());
+    base::append(plan.arrays, ply::RecordArray{[this, width](std::size_t records) {
+                                                 scalars.resize(records * width);
+                                                 return reinterpret_cast<std::byte*>(scalars.data());
+                                               },
+                                               4 * width});
+    base::append(plan.arrays, ply::RecordArray{[this](std::size_t records) {
+                                                 triples.resize(records * 3);
+                                                 return reinterpret_cast<std::byte*>(triples.data());
+                                               },
+                                               12});
+    base::append(plan.sinks, ply::IndexSink{&indices, vertexCount, &counts, nullptr, 65535});
+    for (std::uint32_t p = 0; p < width; ++p) {
+      ply::PropertyPlan target;
+      if (!element.properties[p].isList) {
+        target = {ply::PropertyPlan::Kind::scalar, static_cast<ply::Conversion>(p % 3), 0, 4 * p};
+      } else if (element.properties[p].semantic == ply::PropertySemantic::vertexIndex) {
+        target.kind = ply::PropertyPlan::Kind::indices;
+      } else {
+        target = {ply::PropertyPlan::Kind::valueList, ply::Conversion::toFloat, 1, 0, 3};
+      }
+      base::append(plan.properties, target);
+    }
+    return true;
+  }
+};
+
 // A source without memory access, so that the reader's own buffering is exercised; without
 // position and size it is a pipe.
 class Cold final : public base::StreamWorker {
@@ -72,6 +114,10 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     ply::Header header;
     Touch touch;
     ply::readFile(header, stream, touch);
+    base::Stream planned = open(data, size, source);
+    ply::Header plannedHeader;
+    Planner planner;
+    ply::readFile(plannedHeader, planned, planner);
     // The header alone must leave any source readable at its body.
     base::Stream again = open(data, size, source);
     ply::Header alone;

@@ -65,13 +65,18 @@ inline std::uint32_t listCount(const Value& count, DataType type) {
   return static_cast<std::uint32_t>(count.convertTo<std::int64_t>(type));
 }
 
-/// Asks a receiver that makes plans for the plan of `element`; false when it has none, makes
-/// none, or gives one that does not cover every property.
+/// Asks a receiver that makes plans for the plan of `element`; false when it has none or
+/// makes none. A plan that does not cover every property, or names targets outside its
+/// arrays, is the receiver's fault and throws base::invalid_argument.
 template <class R>
 bool askPlan(R& receiver, const Element& element, ElementPlan& plan) {
   if constexpr (requires { receiver.plyPlan(element, plan); }) {
     plan.clear();
-    return receiver.plyPlan(element, plan) && plan.properties.size() == element.properties.size();
+    if (!receiver.plyPlan(element, plan)) return false;
+    if (plan.properties.size() != element.properties.size() || !plan.fits()) {
+      base::raise<base::invalid_argument>("ply::readFile", "plan");
+    }
+    return true;
   } else {
     return false;
   }

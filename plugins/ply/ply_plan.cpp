@@ -13,6 +13,25 @@ bool ElementPlan::delivers() const {
   });
 }
 
+bool ElementPlan::fits() const {
+  return std::all_of(properties.begin(), properties.end(), [this](const PropertyPlan& property) {
+    switch (property.kind) {
+      case PropertyPlan::Kind::scalar:
+      case PropertyPlan::Kind::valueList: {
+        const std::uint64_t words = property.kind == PropertyPlan::Kind::scalar ? 1 : property.length;
+        return property.array < arrays.size() && arrays[property.array].resize &&
+               std::uint64_t(property.offset) + 4 * words <= arrays[property.array].stride;
+      }
+      case PropertyPlan::Kind::indices:
+        return property.sink < sinks.size() && sinks[property.sink].indices;
+      case PropertyPlan::Kind::deliver:
+      case PropertyPlan::Kind::skip:
+        return true;
+    }
+    return false;
+  });
+}
+
 void BadIndexReport::note(std::uint32_t index, std::uint32_t vertexCount) {
   if (++m_count <= linesPerElement) {
     base::log().message(base::logScene, base::logError, "Invalid vertex index detected {}, max {}!", index,

@@ -81,6 +81,9 @@ struct ElementPlan {
     arrays.clear();
     sinks.clear();
   }
+  /// Whether every property names an array or sink that exists and every target lies
+  /// inside its record.
+  bool fits() const;
   /// Whether some property may go to plyProperty: one to deliver, or a list that another
   /// length sends back to the receiver.
   bool delivers() const;

@@ -375,6 +375,28 @@ TEST(PlyPlan, AsciiElementsWithCommentsBadWordsAndAnEarlyEnd) {
   expectPathsAgree(file);
 }
 
+TEST(PlyPlan, APlanWithTargetsOutsideItsRecordsIsRefused) {
+  struct Misplanned {
+    bool plyElement(const ply::Element&) { return true; }
+    void beginInstance(std::uint32_t) {}
+    void plyProperty(const ply::Element&, const ply::Property&, const ply::ValueArray&) {}
+    bool plyPlan(const ply::Element&, ply::ElementPlan& plan) {
+      base::append(plan.arrays, ply::RecordArray{[this](std::size_t records) {
+                                                   floats.resize(records);
+                                                   return reinterpret_cast<std::byte*>(floats.data());
+                                                 },
+                                                 4});
+      base::append(plan.properties, ply::PropertyPlan{ply::PropertyPlan::Kind::scalar, ply::Conversion::toFloat, 0, 4});
+      return true;
+    }
+    std::vector<float> floats;
+  } receiver;
+  const std::string file = "ply\nformat ascii 1.0\nelement vertex 1\nproperty float x\nend_header\n1\n";
+  base::Stream stream = testing_support::sourceStream(file, Source::memory);
+  ply::Header header;
+  EXPECT_THROW(ply::readFile(header, stream, receiver), base::invalid_argument);
+}
+
 TEST(PlyPlan, HostileCountOverAPipeAllocatesOnlyWhatArrives) {
   // Nothing bounds the count without a size: the columns grow with the data, not the header.
   const std::string file =
