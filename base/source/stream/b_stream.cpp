@@ -61,10 +61,10 @@ void copyRest(Stream& from, Stream& to, const char* function, const char* interf
     if (canPosition) from.setPosition(start, seekBegin);
     throw;
   }
+  if (canPosition) from.setPosition(start, seekBegin);
   if ((from.flags & throwOnShortRead) && expected >= 0 && total < static_cast<std::uint64_t>(expected)) {
     throwShortRead(from, static_cast<std::uint64_t>(expected), total);
   }
-  if (canPosition) from.setPosition(start, seekBegin);
 }
 
 // An in-memory source is written from its block without a copy, from its current position
@@ -255,15 +255,19 @@ void readLines(Stream& stream, base::vector<base::string>& lines) {
   auto isBlank = [](std::uint8_t c) {
     return c == ' ' || c == '\t' || c == '\r' || c == '\n' || c == '\v' || c == '\f';
   };
+  // The blanks after a line break are skipped even where a piece ends among them, so that
+  // a line never depends on where the pieces fall.
+  bool afterBreak = false;
   for (;;) {
     const std::uint32_t got = stream.worker()->read(buffer.data(), copyPiece);
     for (std::uint32_t i = 0; i < got; ++i) {
       const std::uint8_t c = buffer[i];
-      if (c != '\r' && c != '\n') {
+      if (afterBreak && isBlank(c)) continue;
+      afterBreak = c == '\r' || c == '\n';
+      if (!afterBreak) {
         line.push_back(static_cast<char>(c));
         continue;
       }
-      while (i + 1 < got && isBlank(buffer[i + 1])) ++i;
       if (!line.empty()) base::append(lines, std::move(line));
       line.clear();
     }

@@ -139,6 +139,8 @@ class BufReadWorker final : public BufferedWorker {
 
   bool isEOF() override {
     if (m_cursor < m_filled) return false;
+    // A window over a source without a size ends at its length, or a reader never stops.
+    if (m_length > 0 && getPosition() >= m_length) return true;
     return m_source.has(capSize) ? getPosition() >= getSize() : m_source.isEOF();
   }
 

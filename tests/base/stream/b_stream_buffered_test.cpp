@@ -215,4 +215,10 @@ TEST(BufWriteStream, CloseLogsTheBytesThatWereLost) {
   EXPECT_EQ(capture.texts(), std::vector<std::string>{"stream 'out': 3 buffered bytes could not be written"});
 }
 
+TEST(BufReadStream, LengthEndsAWindowOverASourceWithoutASize) {
+  base::Stream window = base::bufReadStream(fileLikeStream("abcdef", base::capRead), 4, 64);
+  EXPECT_EQ(readAll(window), "abcd");
+  EXPECT_TRUE(window.isEOF());
+}
+
 }  // namespace

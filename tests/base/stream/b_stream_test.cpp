@@ -72,6 +72,20 @@ TEST(Stream, CopyOperatorsNeedReadAndWriteAndRestoreTheSource) {
   EXPECT_EQ(untouched.getSize(), 0);
 }
 
+TEST(Stream, CopyOperatorThatThrowsStillRestoresTheSource) {
+  // The size promises more than the data holds: a short read, reported as asked.
+  struct Overstated : testing_support::FileLikeWorker {
+    using FileLikeWorker::FileLikeWorker;
+    std::int64_t getSize() override { return FileLikeWorker::getSize() + 100; }
+  };
+  base::Stream source = base::Stream::adopt(new Overstated("0123456789"));
+  source.flags |= base::throwOnShortRead;
+  source.setPosition(5);
+  base::Stream target = base::memStream(0);
+  EXPECT_THROW(source >> target, base::exception);
+  EXPECT_EQ(source.getPosition(), 5);
+}
+
 TEST(CopyStream, PiecewiseCopyHonoursTheMaximumAndReportsFailures) {
   const std::string data(700000, 'q');
   base::Stream fileLike = fileLikeStream(data);
@@ -134,6 +148,16 @@ TEST(ReadLines, LongInputAcrossPiecesKeepsEveryLine) {
   ASSERT_EQ(lines.size(), 40001u);
   EXPECT_EQ(lines[12345], "line 12345");
   EXPECT_EQ(lines.back(), "last without break");
+}
+
+TEST(ReadLines, BlanksAfterABreakAreSkippedWhereverAPieceEnds) {
+  // The break is the last byte of the first 256 KiB piece; its blanks open the next one.
+  const std::string text = std::string(0x40000 - 1, 'x') + "\n  b";
+  base::Stream stream = fileLikeStream(text);
+  base::vector<base::string> lines;
+  base::readLines(stream, lines);
+  ASSERT_EQ(lines.size(), 2u);
+  EXPECT_EQ(lines[1], "b");
 }
 
 struct ThrowingClose : base::StreamWorker {
