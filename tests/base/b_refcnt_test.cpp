@@ -121,8 +121,8 @@ TEST(WeakRef, RacingTheLastReleaseNeverSeesAFreedTarget) {
     std::atomic<int> started = 0;
     inParallel(4, [&] {
       const int role = started++;
-      while (started < 4) {
-      }
+      // Yielding: on two cores, four spinning threads would starve each other.
+      while (started < 4) std::this_thread::yield();
       switch (role) {
         case 0:
           for (int i = 0; i < 50; ++i) early.visit([](Counted* target) { return target ? target->refCount() : -1; });
