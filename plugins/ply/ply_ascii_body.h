@@ -171,6 +171,7 @@ class AsciiBody {
       base::append(m_counts, WordStore(element.properties[p].countType, Conversion::toIndex));
     }
     PlanTargets targets(m_plan, element.count, m_window.remaining().has_value());
+    m_count = element.count;
     const bool delivers = m_plan.delivers();
     readInstances(element, [&](std::uint32_t i) {
       targets.reach(std::uint64_t(i) + 1);
@@ -236,7 +237,12 @@ class AsciiBody {
       }
     }
     if (indices) {
-      storeIndexList(m_plan.sinks[plan.sink], m_items.data(), count, m_report);
+      const IndexSink& sink = m_plan.sinks[plan.sink];
+      // An ASCII item takes at least two bytes: a digit and a blank.
+      if (sink.indices->capacity() < sink.indices->size() + count) {
+        reserveAhead(sink, m_window.remaining(), std::uint64_t(m_count) - i, count, 2);
+      }
+      storeIndexList(sink, m_items.data(), count, m_report);
     } else {
       std::memcpy(targets.at(plan.array, i, plan.offset), m_items.data(), std::size_t(count) * 4);
     }
@@ -249,7 +255,8 @@ class AsciiBody {
   bool m_ended = false;
   ElementPlan m_plan;
   base::vector<WordStore> m_store;
-  base::vector<WordStore> m_counts;  ///< a list's count; unused for scalars
+  base::vector<WordStore> m_counts;
+  std::uint32_t m_count = 0;  ///< instances of the planned element  ///< a list's count; unused for scalars
   base::vector<std::uint32_t> m_items;
   BadIndexReport m_report;
 };

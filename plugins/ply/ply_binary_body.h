@@ -304,19 +304,6 @@ class BinaryBody {
     }
   }
 
-  // Where the stream's size shows how much data is left, an index sink is given room for the
-  // rest of the element at once, in the lengths of the run that starts now, so that it is not
-  // copied over and over as it grows.
-  void reserveAhead(const IndexSink& sink, std::uint64_t instancesLeft, std::uint32_t count, std::uint32_t itemSize) {
-    const std::optional<std::uint64_t> bytesLeft = m_window.remaining();
-    if (!bytesLeft) return;
-    const std::uint64_t items = std::min(instancesLeft * count, *bytesLeft / itemSize + count);
-    if (sink.indices->capacity() < sink.indices->size() + items) sink.indices->reserve(sink.indices->size() + items);
-    if (sink.listCounts && sink.listCounts->capacity() < sink.listCounts->size() + instancesLeft) {
-      sink.listCounts->reserve(sink.listCounts->size() + std::min(instancesLeft, *bytesLeft / itemSize + 1));
-    }
-  }
-
   void storeUniformRun(const std::uint8_t* records, std::uint64_t size, std::uint64_t first, std::uint64_t run,
                        std::size_t list, std::uint32_t count, PlanTargets& targets) {
     std::uint64_t offset = 0;
@@ -349,7 +336,9 @@ class BinaryBody {
       const IndexSink& sink = m_plan.sinks[plan.sink];
       base::vector<std::uint32_t>& indices = *sink.indices;
       const std::size_t start = indices.size();
-      if (indices.capacity() < start + run * count) reserveAhead(sink, m_elementCount - first, count, step.size);
+      if (indices.capacity() < start + run * count) {
+        reserveAhead(sink, m_window.remaining(), m_elementCount - first, count, step.size);
+      }
       base::reserveForAppend(indices, run * count);
       indices.resize(start + run * count);
       auto* target = reinterpret_cast<std::byte*>(indices.data() + start);

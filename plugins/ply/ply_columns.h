@@ -10,6 +10,7 @@
 #include <cstdint>
 #include <cstring>
 #include <limits>
+#include <optional>
 #include <type_traits>
 
 namespace ply::detail {
@@ -211,6 +212,13 @@ class PlanTargets {
 /// Replaces each index not below `vertexCount` by 0 and reports it; no check for
 /// IndexSink::noRangeCheck.
 void checkIndices(std::uint32_t* indices, std::size_t count, std::uint32_t vertexCount, BadIndexReport& report);
+
+/// Where the stream's size shows how much data is left (`bytesLeft`), gives `sink` room at
+/// once for the rest of an element whose lists have `count` items of at least `itemBytes`
+/// bytes each, so that its lists are not copied over and over as they grow. The data left
+/// bounds the room, whatever the counts say.
+void reserveAhead(const IndexSink& sink, std::optional<std::uint64_t> bytesLeft, std::uint64_t instancesLeft,
+                  std::uint32_t count, std::uint32_t itemBytes);
 
 /// Stores one complete index list into `sink`: checked, split at restart markers for strips,
 /// with its count.

@@ -75,6 +75,17 @@ void checkIndices(std::uint32_t* indices, std::size_t count, std::uint32_t verte
   }
 }
 
+void reserveAhead(const IndexSink& sink, std::optional<std::uint64_t> bytesLeft, std::uint64_t instancesLeft,
+                  std::uint32_t count, std::uint32_t itemBytes) {
+  if (!bytesLeft) return;
+  const std::uint64_t items = std::min(instancesLeft * count, *bytesLeft / itemBytes + count);
+  if (sink.indices->capacity() < sink.indices->size() + items) sink.indices->reserve(sink.indices->size() + items);
+  const std::uint64_t lists = std::min(instancesLeft, *bytesLeft / itemBytes + 1);
+  if (sink.listCounts && sink.listCounts->capacity() < sink.listCounts->size() + lists) {
+    sink.listCounts->reserve(sink.listCounts->size() + lists);
+  }
+}
+
 void storeIndexList(const IndexSink& sink, const std::uint32_t* items, std::size_t count, BadIndexReport& report) {
   base::vector<std::uint32_t>& indices = *sink.indices;
   if (!sink.runCounts) {
