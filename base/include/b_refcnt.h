@@ -31,6 +31,20 @@ struct BASE1_API WeakList {
   /// Nulls every node's target under the node's guard and empties the list.
   void clear();
 };
+
+/// A weak list with the spin lock that guards it: what every weak_ref target keeps.
+struct BASE1_API LockedWeakList {
+  SpinLock lock;
+  WeakList list;
+
+  /// Links `node` to `target`, whose list this is; the caller knows the target is alive.
+  void attach(WeakNode& node, void* target);
+  /// Nulls every weak reference, under the lock.
+  void clear();
+  /// Unlinks a holder's node, safely against a concurrent death of its target; `listOf`
+  /// gives the list of the target that the node points at.
+  static void detach(WeakNode& node, LockedWeakList& (*listOf)(void* target));
+};
 }  // namespace detail
 
 /// Intrusive, thread-safe reference count. A new object's count is 0 until its first
@@ -39,6 +53,9 @@ struct BASE1_API WeakList {
 /// gives the memory back to the host allocator.
 class BASE1_API RefCntAtomic : public HostAllocated {
 public:
+  /// The class whose weak list a weak_ref of a derived class uses.
+  using WeakBase = RefCntAtomic;
+
   RefCntAtomic() = default;
   // A copy is a new object: it starts with no references of its own.
   RefCntAtomic(const RefCntAtomic&) {}
@@ -60,13 +77,14 @@ protected:
 
 private:
   std::atomic<std::int32_t> m_count{0};
-  SpinLock m_lock;
-  detail::WeakList m_weak;
+  detail::LockedWeakList m_weak;
 };
 
 /// The same scheme for objects used by one thread: a plain count and no lock.
 class BASE1_API RefCnt : public HostAllocated {
 public:
+  using WeakBase = RefCnt;
+
   RefCnt() = default;
   RefCnt(const RefCnt&) {}
   RefCnt& operator=(const RefCnt&) { return *this; }
@@ -172,7 +190,7 @@ public:
       SpinLock& lock;
       ~Unlock() { lock.unlock(); }
     } unlock{m_node.guard};
-    return f(static_cast<T*>(static_cast<typename Base<T>::type*>(m_node.target)));
+    return f(static_cast<T*>(static_cast<typename T::WeakBase*>(m_node.target)));
   }
 
   bool expired() const {
@@ -180,12 +198,8 @@ public:
   }
 
 private:
-  // The node stores the counted base's address; the cast back goes through that base.
-  template <class U>
-  struct Base {
-    using type = std::conditional_t<std::is_base_of_v<RefCntAtomic, U>, RefCntAtomic, RefCnt>;
-  };
-
+  // The node stores the address of T's weak base (`T::WeakBase`, the class that owns the
+  // weak list); the cast back goes through that base.
   mutable WeakNode m_node;
 };
 

@@ -34,53 +34,60 @@ void WeakList::clear() {
   }
 }
 
-}  // namespace detail
-
-// An object destroyed without its last release (one on the stack, say) still leaves no
-// weak reference dangling.
-RefCntAtomic::~RefCntAtomic() {
-  m_lock.lock();
-  m_weak.clear();
-  m_lock.unlock();
+void LockedWeakList::attach(WeakNode& node, void* target) {
+  lock.lock();
+  list.push(node, target);
+  lock.unlock();
 }
 
-bool RefCntAtomic::release() {
-  if (m_count.fetch_sub(1, std::memory_order_acq_rel) != 1) return false;
-  m_lock.lock();
-  m_weak.clear();
-  m_lock.unlock();
-  releaseHook();
-  return true;
+void LockedWeakList::clear() {
+  lock.lock();
+  list.clear();
+  lock.unlock();
 }
 
-void RefCntAtomic::releaseHook() { delete this; }
-
-void RefCntAtomic::attachWeak(WeakNode& node) {
-  m_lock.lock();
-  m_weak.push(node, this);
-  m_lock.unlock();
-}
-
-void RefCntAtomic::detachWeak(WeakNode& node) {
+void LockedWeakList::detach(WeakNode& node, LockedWeakList& (*listOf)(void* target)) {
   // Lock order is target, then node (the dying target's order). Holding the node's guard
   // keeps the target alive, so it is safe to try its lock; on contention let go and retry.
   unsigned attempt = 0;
   for (;;) {
     node.guard.lock();
-    auto* target = static_cast<RefCntAtomic*>(node.target);
-    if (!target) {
+    if (!node.target) {
       node.guard.unlock();
       return;
     }
-    if (target->m_lock.try_lock()) {
-      target->m_weak.unlink(node);
-      target->m_lock.unlock();
+    LockedWeakList& weak = listOf(node.target);
+    if (weak.lock.try_lock()) {
+      weak.list.unlink(node);
+      weak.lock.unlock();
       node.guard.unlock();
       return;
     }
     node.guard.unlock();
     SpinLock::backOff(attempt);
   }
+}
+
+}  // namespace detail
+
+// An object destroyed without its last release (one on the stack, say) still leaves no
+// weak reference dangling.
+RefCntAtomic::~RefCntAtomic() { m_weak.clear(); }
+
+bool RefCntAtomic::release() {
+  if (m_count.fetch_sub(1, std::memory_order_acq_rel) != 1) return false;
+  m_weak.clear();
+  releaseHook();
+  return true;
+}
+
+void RefCntAtomic::releaseHook() { delete this; }
+
+void RefCntAtomic::attachWeak(WeakNode& node) { m_weak.attach(node, this); }
+
+void RefCntAtomic::detachWeak(WeakNode& node) {
+  detail::LockedWeakList::detach(
+      node, [](void* target) -> detail::LockedWeakList& { return static_cast<RefCntAtomic*>(target)->m_weak; });
 }
 
 RefCnt::~RefCnt() { m_weak.clear(); }
