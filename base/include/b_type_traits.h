@@ -12,11 +12,11 @@ namespace base {
 template <class T>
 struct TypeTraits;
 
-#define BASE_TYPE_NAMES(Type, Name)                                  \
-  template <>                                                        \
-  struct TypeTraits<Type> {                                          \
-    static inline const name_id n_name = intern(Name);               \
-    static inline const name_id n_array_name = intern(Name "[]");    \
+#define BASE_TYPE_NAMES(Type, Name)                               \
+  template <>                                                     \
+  struct TypeTraits<Type> {                                       \
+    static inline const name_id n_name = intern(Name);            \
+    static inline const name_id n_array_name = intern(Name "[]"); \
   }
 
 BASE_TYPE_NAMES(bool, "bool");
@@ -31,5 +31,12 @@ BASE_TYPE_NAMES(std::uint64_t, "uint64");
 BASE_TYPE_NAMES(float, "float");
 BASE_TYPE_NAMES(double, "double");
 BASE_TYPE_NAMES(base::string, "string");
+
+/// A list of T goes by T's array name ("float[]"), so that maps reach lists as
+/// `attribute<base::vector<float>>`.
+template <class T>
+struct TypeTraits<base::vector<T>> {
+  static inline const name_id n_name = TypeTraits<T>::n_array_name;
+};
 
 }  // namespace base

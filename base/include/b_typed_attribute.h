@@ -1,0 +1,175 @@
+#pragma once
+
+#include "b_attribute.h"
+#include "b_components.h"
+#include "b_exception.h"
+#include "b_string_conversion.h"
+#include "b_type_traits.h"
+
+#include <cstdint>
+#include <type_traits>
+
+namespace base {
+
+namespace detail {
+
+/// The component code of a scalar type: 1 uint8, 3 uint16, 5 uint32, 6 int32, 10 float,
+/// 11 double as the stored forms know them; the others fill the free codes (0 int8, 2 int16,
+/// 4 bool, 7 int64, 8 uint64, 9 text).
+template <class C>
+constexpr std::uint8_t componentCode() {
+  if constexpr (std::is_same_v<C, bool>)
+    return 4;
+  else if constexpr (std::is_same_v<C, float>)
+    return 10;
+  else if constexpr (std::is_same_v<C, double>)
+    return 11;
+  else if constexpr (std::is_integral_v<C> && sizeof(C) == 1)
+    return std::is_signed_v<C> ? 0 : 1;
+  else if constexpr (std::is_integral_v<C> && sizeof(C) == 2)
+    return std::is_signed_v<C> ? 2 : 3;
+  else if constexpr (std::is_integral_v<C> && sizeof(C) == 4)
+    return std::is_signed_v<C> ? 6 : 5;
+  else if constexpr (std::is_integral_v<C> && sizeof(C) == 8)
+    return std::is_signed_v<C> ? 7 : 8;
+  else
+    return 9;
+}
+
+/// The component code of a value type: that of its first component.
+template <class T>
+constexpr std::uint8_t valueCode() {
+  if constexpr (ComponentValue<T>)
+    return componentCode<component_t<T, 0>>();
+  else
+    return componentCode<T>();
+}
+
+/// -1, 0 or 1: component by component, the first pair that is not equal decides; two
+/// components are equal when neither is less than the other, so NaN equals anything.
+template <class T>
+int compareValues(const T& mine, const T& other) {
+  if constexpr (ComponentValue<T>) {
+    int order = 0;
+    forEachComponent(mine, other, [&order](const auto& a, const auto& b) {
+      if (order == 0 && (a < b || b < a)) order = a >= b ? 1 : -1;
+    });
+    return order;
+  } else {
+    return mine < other ? -1 : (other < mine ? 1 : 0);
+  }
+}
+
+}  // namespace detail
+
+/// An attribute holding one value of type T.
+template <class T>
+class TypedAttribute : public Attribute {
+ public:
+  TypedAttribute() = default;
+  explicit TypedAttribute(const T& value) : m_value(value) {}
+
+  name_id type() const override { return TypeTraits<T>::n_name; }
+  Attribute* clone() const override {
+    auto* copy = new TypedAttribute(m_value);
+    copy->flags = flags;
+    return copy;
+  }
+  std::uint8_t componentType() const override { return detail::valueCode<T>(); }
+  void* data(int = -1) override { return &m_value; }
+  std::uint32_t byteSize() const override {
+    if constexpr (std::is_same_v<T, base::string>)
+      return static_cast<std::uint32_t>(4 + m_value.size());
+    else
+      return sizeof(T);
+  }
+  /// Needs mode bit 0 and a source of the same type.
+  bool copyFrom(const Attribute& source, std::uint32_t mode, int = -1) override {
+    if (!(mode & copyOverwrite) || source.type() != type()) return false;
+    m_value = *static_cast<const T*>(source.data());
+    return true;
+  }
+  base::string toString() const override { return toText(m_value); }
+  bool fromString(std::string_view text) override {
+    T parsed = m_value;
+    try {
+      from_string(text, parsed);
+    } catch (const string_conversion_exception&) {
+      return false;
+    }
+    m_value = parsed;
+    return true;
+  }
+  void setData(const void* data, int = -1) override { m_value = *static_cast<const T*>(data); }
+  int compareData(const void* data, int = -1) const override {
+    return detail::compareValues(m_value, *static_cast<const T*>(data));
+  }
+
+  const T& value() const { return m_value; }
+  T& value() { return m_value; }
+
+ private:
+  T m_value{};
+};
+
+/// An attribute holding a growable list of values of type T.
+template <class T>
+class TypedVectorAttribute : public Attribute {
+ public:
+  TypedVectorAttribute() = default;
+
+  name_id type() const override { return TypeTraits<T>::n_array_name; }
+  Attribute* clone() const override {
+    auto* copy = new TypedVectorAttribute;
+    copy->m_values = m_values;
+    copy->flags = flags;
+    return copy;
+  }
+  std::uint8_t componentType() const override { return detail::valueCode<T>(); }
+  /// Index -1: the list (base::vector<T>*); otherwise element `index`, or null past the end.
+  void* data(int index = -1) override {
+    if (index < 0) return &m_values;
+    return static_cast<std::size_t>(index) < m_values.size() ? &m_values[static_cast<std::size_t>(index)] : nullptr;
+  }
+  std::uint32_t size() const override { return static_cast<std::uint32_t>(m_values.size()); }
+  bool erase(int index) override {
+    if (index < 0 || static_cast<std::size_t>(index) >= m_values.size()) return false;
+    m_values.erase(m_values.begin() + index);
+    return true;
+  }
+  std::uint32_t byteSize() const override { return static_cast<std::uint32_t>(4 + m_values.size() * sizeof(T)); }
+  /// Needs mode bit 0 and a source of the same type.
+  bool copyFrom(const Attribute& source, std::uint32_t mode, int = -1) override {
+    if (!(mode & copyOverwrite) || source.type() != type()) return false;
+    m_values = *static_cast<const base::vector<T>*>(source.data());
+    return true;
+  }
+  void setData(const void* data, int index = -1) override {
+    if (index < 0) {
+      m_values = *static_cast<const base::vector<T>*>(data);
+    } else if (static_cast<std::size_t>(index) < m_values.size()) {
+      m_values[static_cast<std::size_t>(index)] = *static_cast<const T*>(data);
+    }
+  }
+  /// Index -1: a shorter list is less; else element by element. Otherwise element `index`.
+  int compareData(const void* data, int index = -1) const override {
+    if (index >= 0) {
+      if (static_cast<std::size_t>(index) >= m_values.size()) return 1;
+      return detail::compareValues(m_values[static_cast<std::size_t>(index)], *static_cast<const T*>(data));
+    }
+    const auto& other = *static_cast<const base::vector<T>*>(data);
+    if (m_values.size() != other.size()) return m_values.size() < other.size() ? -1 : 1;
+    for (std::size_t k = 0; k < m_values.size(); ++k) {
+      if (const int order = detail::compareValues(m_values[k], other[k]); order != 0) return order;
+    }
+    return 0;
+  }
+
+  const base::vector<T>& values() const { return m_values; }
+  base::vector<T>& values() { return m_values; }
+
+ private:
+  base::vector<T> m_values;
+};
+
+}  // namespace base
