@@ -85,6 +85,14 @@ bool AttribFactory::knows(name_id type) const {
   return m_creators.count(type) != 0;
 }
 
+base::vector<name_id> AttribFactory::types() const {
+  std::lock_guard lock(m_mutex);
+  base::vector<name_id> names;
+  names.reserve(m_creators.size());
+  for (const auto& entry : m_creators) names.push_back(entry.first);
+  return names;
+}
+
 AttribFactory& attribFactory() {
   // Never destroyed: attributes may be created while other static objects go away.
   static AttribFactory* instance = [] {

@@ -22,6 +22,8 @@ class BASE1_API AttribFactory {
   Attribute* create(name_id type) const;
   /// Whether `type` can be created.
   bool knows(name_id type) const;
+  /// The registered type names, in handle order.
+  base::vector<name_id> types() const;
 
  private:
   mutable std::mutex m_mutex;

@@ -14,6 +14,8 @@ namespace base {
 class AttribArray;
 class AttribLink;
 class AttribMap;
+class BinaryContext;
+class Stream;
 
 /// Bits of an attribute's `flags`. The low byte is the persistent part.
 enum AttributeFlag : std::uint32_t {
@@ -53,6 +55,12 @@ class BASE1_API Attribute : public HostAllocated {
   /// The scalar element type: 1 uint8, 3 uint16, 5 uint32, 6 int32, 10 float, 11 double;
   /// 0xFF for structures.
   virtual std::uint8_t componentType() const = 0;
+  /// The binary form: the persistent flags byte, then the class's value; names go through
+  /// `context`. Stream failures throw.
+  virtual void write(Stream& stream, BinaryContext& context) const;
+  /// Reads the binary form that write gives. A form that ends early or counts more than the
+  /// stream holds throws.
+  virtual void read(Stream& stream, BinaryContext& context);
   /// The raw value (index -1) or the element `index` of a list or structure.
   virtual void* data(int index = -1) = 0;
   /// The element count: 1 for a single value.

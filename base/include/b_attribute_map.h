@@ -34,6 +34,14 @@ class BASE1_API AttribMap : public Attribute {
   /// Same factory, flags and base map, members cloned; the map type is not copied.
   Attribute* clone() const override;
   std::uint8_t componentType() const override { return 0xFF; }
+  /// The flags byte, the count of stored members, then per member its name and type name
+  /// (through `context`), the byte length of its binary form (32 bits) and that form.
+  /// Members with flags bit 31 are left out.
+  void write(Stream& stream, BinaryContext& context) const override;
+  /// Reads the members back, inserted at their places (an existing member of the same name is
+  /// replaced). A member of a type the factory does not know is skipped by its length, with a
+  /// warning; reading goes on with the next one.
+  void read(Stream& stream, BinaryContext& context) override;
   /// Index -1: the member array (Members*); otherwise member `index`'s value.
   void* data(int index = -1) override;
   std::uint32_t size() const override { return static_cast<std::uint32_t>(m_members.size()); }
@@ -113,6 +121,7 @@ class BASE1_API AttribMap : public Attribute {
   Attribute* create(name_id type) const;
   void insert(Members::iterator at, name_id name, Attribute* attr);
   void destroyMembers();
+  static void readSized(Stream& stream, Attribute& attr, BinaryContext& context, std::uint32_t length);
 
   name_id m_mapType = nullptr;
   Members m_members;

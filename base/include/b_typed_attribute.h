@@ -1,6 +1,7 @@
 #pragma once
 
 #include "b_attribute.h"
+#include "b_binary_io.h"
 #include "b_components.h"
 #include "b_exception.h"
 #include "b_string_conversion.h"
@@ -60,6 +61,41 @@ int compareValues(const T& mine, const T& other) {
   }
 }
 
+/// The bytes of T's components: sizeof(T) when T has no padding, so that lists of it can be
+/// written and read as one block.
+template <class T>
+constexpr std::size_t componentBytes() {
+  if constexpr (ComponentValue<T>) {
+    std::size_t bytes = 0;
+    T value{};
+    forEachComponent(value, [&bytes](auto& component) { bytes += sizeof(component); });
+    return bytes;
+  } else {
+    return sizeof(T);
+  }
+}
+
+/// Writes one value: text as its length and bytes, other values component by component.
+template <class T>
+void writeValue(Stream& stream, const T& value) {
+  if constexpr (std::is_same_v<T, base::string>) {
+    binary::put(stream, static_cast<std::uint32_t>(value.size()));
+    binary::write(stream, value.data(), value.size());
+  } else {
+    forEachComponent(value, [&stream](const auto& component) { binary::put(stream, component); });
+  }
+}
+
+template <class T>
+void readValue(Stream& stream, T& value) {
+  if constexpr (std::is_same_v<T, base::string>) {
+    value.resize(binary::readCount(stream, 1, "text bytes"));
+    binary::read(stream, value.data(), value.size());
+  } else {
+    forEachComponent(value, [&stream](auto& component) { binary::read(stream, &component, sizeof component); });
+  }
+}
+
 }  // namespace detail
 
 /// An attribute holding one value of type T.
@@ -76,6 +112,14 @@ class TypedAttribute : public Attribute {
     return copy;
   }
   std::uint8_t componentType() const override { return detail::valueCode<T>(); }
+  void write(Stream& stream, BinaryContext& context) const override {
+    Attribute::write(stream, context);
+    detail::writeValue(stream, m_value);
+  }
+  void read(Stream& stream, BinaryContext& context) override {
+    Attribute::read(stream, context);
+    detail::readValue(stream, m_value);
+  }
   void* data(int = -1) override { return &m_value; }
   std::uint32_t byteSize() const override {
     if constexpr (std::is_same_v<T, base::string>)
@@ -126,6 +170,34 @@ class TypedVectorAttribute : public Attribute {
     return copy;
   }
   std::uint8_t componentType() const override { return detail::valueCode<T>(); }
+  /// The flags byte, the element count (32 bits), then the elements.
+  void write(Stream& stream, BinaryContext& context) const override {
+    Attribute::write(stream, context);
+    binary::put(stream, static_cast<std::uint32_t>(m_values.size()));
+    if constexpr (packed) {
+      binary::write(stream, m_values.data(), m_values.size() * sizeof(T));
+    } else {
+      for (const T& value : m_values) detail::writeValue(stream, value);
+    }
+  }
+  /// The count is trusted only as far as the bytes left; where the stream cannot tell, the
+  /// list grows with the data that arrives.
+  void read(Stream& stream, BinaryContext& context) override {
+    Attribute::read(stream, context);
+    const std::uint32_t count = binary::readCount(stream, detail::componentBytes<T>(), "list elements");
+    m_values.clear();
+    constexpr std::uint32_t step = 1 << 16;
+    for (std::uint32_t done = 0; done < count;) {
+      const std::uint32_t batch = binary::bytesLeft(stream) ? count - done : std::min(count - done, step);
+      m_values.resize(done + batch);
+      if constexpr (packed) {
+        binary::read(stream, m_values.data() + done, std::uint64_t(batch) * sizeof(T));
+      } else {
+        for (std::uint32_t k = 0; k < batch; ++k) detail::readValue(stream, m_values[done + k]);
+      }
+      done += batch;
+    }
+  }
   /// Index -1: the list (base::vector<T>*); otherwise element `index`, or null past the end.
   void* data(int index = -1) override {
     if (index < 0) return &m_values;
@@ -169,6 +241,8 @@ class TypedVectorAttribute : public Attribute {
   base::vector<T>& values() { return m_values; }
 
  private:
+  static constexpr bool packed = !std::is_same_v<T, base::string> && detail::componentBytes<T>() == sizeof(T);
+
   base::vector<T> m_values;
 };
 

@@ -1,5 +1,7 @@
 #include "b_attribute.h"
 
+#include "b_binary_io.h"
+
 namespace base {
 
 Attribute::~Attribute() { m_weak.clear(); }
@@ -7,6 +9,14 @@ Attribute::~Attribute() { m_weak.clear(); }
 AttribLink* Attribute::asLink() { return nullptr; }
 AttribArray* Attribute::asArray() { return nullptr; }
 AttribMap* Attribute::asMap() { return nullptr; }
+void Attribute::write(Stream& stream, BinaryContext&) const {
+  binary::put(stream, static_cast<std::uint8_t>(flags & attrPersistent));
+}
+
+void Attribute::read(Stream& stream, BinaryContext&) {
+  flags = (flags & ~std::uint32_t(attrPersistent)) | binary::get<std::uint8_t>(stream);
+}
+
 std::uint32_t Attribute::size() const { return 1; }
 bool Attribute::erase(int) { return false; }
 base::string Attribute::toString() const { return {}; }

@@ -1,5 +1,8 @@
 #include "b_attribute_map.h"
 
+#include "b_binary_io.h"
+#include "b_stream.h"
+
 #include "b_exception.h"
 #include "b_log.h"
 
@@ -7,6 +10,7 @@
 
 #include <algorithm>
 #include <cstring>
+#include <memory>
 #include <mutex>
 
 namespace base {
@@ -124,6 +128,94 @@ int AttribMap::compareData(const void* data, int index) const {
     if (const int order = mine.second->compareData(theirs.second->data()); order != 0) return order;
   }
   return 0;
+}
+
+namespace {
+
+bool stored(const AttribMap::Member& member) { return member.second && !(member.second->flags & attrNotStored); }
+
+// Counts what is written to it and keeps nothing.
+class ByteCounter final : public StreamWorker {
+ public:
+  ByteCounter() : StreamWorker(capWrite, "byte counter") {}
+  std::uint32_t write(const void*, std::uint32_t count) override {
+    total += count;
+    return count;
+  }
+  std::uint64_t total = 0;
+};
+
+// A member's binary form preceded by its byte length, which a first pass counts: no stream
+// has to go back and no form is buffered (a list's elements are counted as one block).
+void writeSized(Stream& stream, const Attribute& attr, BinaryContext& context) {
+  auto* counter = new ByteCounter;
+  Stream counting = Stream::adopt(counter);
+  attr.write(counting, context);
+  if (counter->total > 0xFFFFFFFFu) {
+    raise<exception>("base::AttribMap::write", fmt::format("A member of type '{}' takes {} bytes, more than 4 GiB",
+                                                           text(attr.type()), counter->total));
+  }
+  binary::put(stream, static_cast<std::uint32_t>(counter->total));
+  attr.write(stream, context);
+}
+
+// The least a stored member takes: two 16-bit name ids, its length and its flags byte.
+constexpr std::uint64_t smallestMember = 2 + 2 + 4 + 1;
+
+}  // namespace
+
+void AttribMap::write(Stream& stream, BinaryContext& context) const {
+  Attribute::write(stream, context);
+  binary::put(stream, static_cast<std::uint32_t>(std::count_if(m_members.begin(), m_members.end(), stored)));
+  for (const Member& member : m_members) {
+    if (!stored(member)) continue;
+    context.writeName(stream, member.first);
+    context.writeName(stream, member.second->type());
+    writeSized(stream, *member.second, context);
+  }
+}
+
+void AttribMap::read(Stream& stream, BinaryContext& context) {
+  Attribute::read(stream, context);
+  const std::uint32_t count = binary::readCount(stream, smallestMember, "map members");
+  for (std::uint32_t k = 0; k < count; ++k) {
+    const name_id name = context.readName(stream);
+    const name_id type = context.readName(stream);
+    const std::uint32_t length = binary::readCount(stream, 1, "member bytes");
+    std::unique_ptr<Attribute> attr(m_factory->create(type));
+    if (!attr) {
+      log().message(logSystem, logWarning,
+                    "map attribute: Attribute '{}' has unknown type. This may be caused by newer version or "
+                    "corrupted file. Trying to skip...",
+                    clipped(text(name)));
+      if (const std::uint64_t skipped = stream.skip(length); skipped < length) {
+        binary::failShort(stream, length, skipped);
+      }
+      continue;
+    }
+    readSized(stream, *attr, context, length);
+    auto at = lowerBound(name);
+    if (at != m_members.end() && at->first == name) {
+      delete std::exchange(at->second, attr.release());
+    } else {
+      insert(at, name, attr.release());
+    }
+  }
+}
+
+void AttribMap::readSized(Stream& stream, Attribute& attr, BinaryContext& context, std::uint32_t length) {
+  if (!stream.has(capPosition)) {
+    attr.read(stream, context);
+    return;
+  }
+  const std::int64_t start = stream.getPosition();
+  attr.read(stream, context);
+  const std::int64_t used = stream.getPosition() - start;
+  if (used > length) {
+    raise<exception>("base::AttribMap::read", fmt::format("stream '{}': a member of type '{}' took {} bytes of its {}",
+                                                          clipped(stream.name()), text(attr.type()), used, length));
+  }
+  stream.setPosition(start + length);
 }
 
 void AttribMap::attribute(name_id name, Attribute* attr) {

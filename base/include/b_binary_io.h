@@ -1,0 +1,79 @@
+#pragma once
+
+// The binary forms of attributes: little-endian numbers, names through a context, and the
+// checks that keep a truncated or hostile input from reading garbage or allocating more than
+// the input can hold.
+
+#include "b_api.h"
+#include "b_containers.h"
+#include "b_name.h"
+#include "b_stream.h"
+
+#include <bit>
+#include <cstdint>
+#include <optional>
+#include <string_view>
+
+namespace base {
+
+static_assert(std::endian::native == std::endian::little, "the binary forms are written as the machine holds them");
+
+/// How the binary forms store names and type names.
+class BASE1_API BinaryContext {
+ public:
+  virtual ~BinaryContext();
+  /// The plain form: the text's byte length (32 bits), then its bytes.
+  virtual void writeName(Stream& stream, name_id name);
+  /// Reads a name of the plain form. A length over 256 MiB, or over what the stream has
+  /// left, throws.
+  virtual name_id readName(Stream& stream);
+};
+
+/// Names as 16-bit ids of a string table that the context keeps and its user stores.
+class BASE1_API StringIdContext : public BinaryContext {
+ public:
+  /// Writes the name's id, giving new names the next id; more than 65,536 names throw.
+  void writeName(Stream& stream, name_id name) override;
+  /// Reads an id; one outside the table throws.
+  name_id readName(Stream& stream) override;
+
+  const base::vector<name_id>& table() const { return m_table; }
+  void setTable(base::vector<name_id> table);
+
+ private:
+  base::vector<name_id> m_table;
+  base::map<name_id, std::uint16_t> m_ids;
+};
+
+/// The plain context, for callers that need no string table.
+BASE1_API BinaryContext& plainContext();
+
+namespace binary {
+
+/// Writes `size` bytes; a short write throws as the stream's flags say.
+BASE1_API void write(Stream& stream, const void* data, std::uint64_t size);
+/// Reads exactly `size` bytes. A short read always throws (the stream's short-read message):
+/// a binary form that ends early has no other way to say so.
+BASE1_API void read(Stream& stream, void* data, std::uint64_t size);
+/// Throws the stream's short-read message for `wanted` bytes of which `got` came.
+[[noreturn]] BASE1_API void failShort(Stream& stream, std::uint64_t wanted, std::uint64_t got);
+/// Bytes the stream has left, when it can tell.
+BASE1_API std::optional<std::uint64_t> bytesLeft(Stream& stream);
+/// Reads a 32-bit count of items that take at least `itemBytes` bytes each; a count that the
+/// bytes left cannot hold throws, naming `what`.
+BASE1_API std::uint32_t readCount(Stream& stream, std::uint64_t itemBytes, std::string_view what);
+
+template <class T>
+void put(Stream& stream, T value) {
+  write(stream, &value, sizeof value);
+}
+
+template <class T>
+T get(Stream& stream) {
+  T value{};
+  read(stream, &value, sizeof value);
+  return value;
+}
+
+}  // namespace binary
+}  // namespace base

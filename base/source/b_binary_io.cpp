@@ -1,0 +1,112 @@
+#include "b_binary_io.h"
+
+#include "b_exception.h"
+#include "b_log.h"
+
+#include <fmt/format.h>
+
+#include <algorithm>
+
+namespace base {
+namespace {
+
+constexpr std::uint32_t longestName = 0x10000000;
+
+}  // namespace
+
+BinaryContext::~BinaryContext() = default;
+
+void BinaryContext::writeName(Stream& stream, name_id name) {
+  const std::string_view bytes = text(name);
+  binary::put(stream, static_cast<std::uint32_t>(bytes.size()));
+  binary::write(stream, bytes.data(), bytes.size());
+}
+
+name_id BinaryContext::readName(Stream& stream) {
+  const auto length = binary::get<std::uint32_t>(stream);
+  if (length > longestName)
+    raise<exception>("base::xdr_read", "Trying to read a string bigger then 256MB, aborting...");
+  if (const auto left = binary::bytesLeft(stream); left && length > *left) {
+    raise<exception>("base::xdr_read", fmt::format("stream '{}': a name of {} bytes, but only {} bytes are left",
+                                                   clipped(stream.name()), length, *left));
+  }
+  base::string bytes(length, '\0');
+  binary::read(stream, bytes.data(), length);
+  return intern(bytes);
+}
+
+void StringIdContext::writeName(Stream& stream, name_id name) {
+  auto found = m_ids.find(name);
+  if (found == m_ids.end()) {
+    if (m_table.size() > 0xFFFF) raise<exception>("base::StringIdContext::writeName", "More than 65536 names to store");
+    found = m_ids.emplace(name, static_cast<std::uint16_t>(m_table.size())).first;
+    base::append(m_table, name);
+  }
+  binary::put(stream, found->second);
+}
+
+name_id StringIdContext::readName(Stream& stream) {
+  const auto id = binary::get<std::uint16_t>(stream);
+  if (id >= m_table.size()) {
+    raise<exception>("base::StringIdContext::readName",
+                     fmt::format("Name id {} is not in the table of {} names", id, m_table.size()));
+  }
+  return m_table[id];
+}
+
+void StringIdContext::setTable(base::vector<name_id> table) {
+  m_table = std::move(table);
+  m_ids.clear();
+  for (std::size_t k = 0; k < m_table.size(); ++k) m_ids.emplace(m_table[k], static_cast<std::uint16_t>(k));
+}
+
+BinaryContext& plainContext() {
+  static BinaryContext context;
+  return context;
+}
+
+namespace binary {
+
+void write(Stream& stream, const void* data, std::uint64_t size) {
+  const auto* bytes = static_cast<const std::uint8_t*>(data);
+  // Stream calls take 32-bit counts: larger blocks go in pieces.
+  for (std::uint64_t done = 0; done < size;) {
+    const auto piece = static_cast<std::uint32_t>(std::min<std::uint64_t>(size - done, 0x40000000));
+    const std::uint32_t written = stream.write(bytes + done, piece);
+    done += written;
+    if (written < piece) return;
+  }
+}
+
+void read(Stream& stream, void* data, std::uint64_t size) {
+  auto* bytes = static_cast<std::uint8_t*>(data);
+  for (std::uint64_t done = 0; done < size;) {
+    const auto piece = static_cast<std::uint32_t>(std::min<std::uint64_t>(size - done, 0x40000000));
+    const std::uint32_t got = stream.read(bytes + done, piece);
+    done += got;
+    if (got < piece) failShort(stream, size, done);
+  }
+}
+
+void failShort(Stream& stream, std::uint64_t wanted, std::uint64_t got) {
+  raise<exception>("base::Stream::read", fmt::format("stream '{}': trying to read {} bytes, read {} bytes",
+                                                     clipped(stream.name()), wanted, got));
+}
+
+std::optional<std::uint64_t> bytesLeft(Stream& stream) {
+  if (!stream.has(capSize | capPosition)) return std::nullopt;
+  return static_cast<std::uint64_t>(std::max<std::int64_t>(stream.getSize() - stream.getPosition(), 0));
+}
+
+std::uint32_t readCount(Stream& stream, std::uint64_t itemBytes, std::string_view what) {
+  const auto count = get<std::uint32_t>(stream);
+  if (const auto left = bytesLeft(stream); left && count * itemBytes > *left) {
+    raise<exception>("base::Attribute::read",
+                     fmt::format("stream '{}': {} {} need at least {} bytes, but only {} bytes are left",
+                                 clipped(stream.name()), count, what, count * itemBytes, *left));
+  }
+  return count;
+}
+
+}  // namespace binary
+}  // namespace base

@@ -1,0 +1,157 @@
+// The binary forms of attributes and maps: round trips, left-out members, members of types
+// the reader lacks, and inputs that end early or count more than they hold.
+
+#include "b_attribute_map.h"
+#include "b_box.h"
+#include "b_color.h"
+#include "b_matrix.h"
+#include "b_normal.h"
+#include "b_quat.h"
+#include "b_timecode.h"
+#include "b_typed_attribute.h"
+#include "b_vec.h"
+#include "log_capture.h"
+#include "test_streams.h"
+
+#include <gtest/gtest.h>
+
+#include <memory>
+
+namespace {
+
+using testing_support::LogCapture;
+
+base::name_id operator""_n(const char* text, std::size_t length) { return base::intern({text, length}); }
+
+// Writes `attr`, reads it into a fresh attribute of its type, and says whether they agree.
+void expectRoundTrip(const base::Attribute& attr, base::BinaryContext& context = base::plainContext()) {
+  base::Stream stream = base::memStream(0);
+  attr.write(stream, context);
+  stream.setPosition(0);
+  std::unique_ptr<base::Attribute> copy(base::attribFactory().create(attr.type()));
+  ASSERT_NE(copy, nullptr) << base::text(attr.type());
+  copy->read(stream, context);
+  EXPECT_EQ(stream.getPosition(), stream.getSize()) << base::text(attr.type());
+  EXPECT_EQ(copy->flags, attr.flags & base::attrPersistent) << base::text(attr.type());
+  EXPECT_EQ(copy->compareData(attr.data()), 0) << base::text(attr.type());
+  EXPECT_EQ(attr.compareData(copy->data()), 0) << base::text(attr.type());
+}
+
+TEST(AttributeBinary, EveryFactoryTypeRoundTripsItsDefault) {
+  for (base::name_id type : base::attribFactory().types()) {
+    std::unique_ptr<base::Attribute> attr(base::attribFactory().create(type));
+    attr->flags = 0x45 | base::attrRuntime;  // the run-time mark is never stored
+    expectRoundTrip(*attr);
+  }
+}
+
+TEST(AttributeBinary, ValuesAndListsRoundTrip) {
+  base::TypedAttribute<base::string> text(base::string("t\0ext", 5));
+  base::TypedAttribute<base::base_vec2<unsigned char>> bytes({7, 250});
+  base::TypedAttribute<base::base_quat<double>> rotation({0.1, -0.2, 0.3, 1e300});
+  base::TypedAttribute<base::TimeCode> time(base::TimeCode{-123456789012345});
+  base::TypedAttribute<base::base_color4<float>> color({0.5f, 1, 0, 0.25f});
+  base::TypedVectorAttribute<base::detail::mat43f_type> transforms;
+  transforms.values().resize(3);
+  transforms.values()[1].translation = {1e100, -2, 3};
+  transforms.values()[2].rotation.m[1][2] = 0.5f;
+  base::TypedVectorAttribute<base::base_box<base::base_vec3<float>>> boxes;
+  boxes.values() = {{{-1, -2, -3}, {1, 2, 3}}};
+  base::TypedVectorAttribute<base::normal> normals;
+  normals.values() = {{0, 0, 1}, {1, 0, 0}};
+  for (const base::Attribute* attr : std::initializer_list<const base::Attribute*>{
+           &text, &bytes, &rotation, &time, &color, &transforms, &boxes, &normals}) {
+    expectRoundTrip(*attr);
+  }
+}
+
+TEST(AttributeBinary, NestedMapsRoundTripWithoutMembersMarkedNotStored) {
+  base::AttribMap map;
+  map.attribute<int>("count"_n) = 3;
+  map.attribute<base::vector<base::base_vec3<float>>>("positions"_n) = {{1, 2, 3}, {4, 5, 6}};
+  auto* nested = new base::AttribMap;
+  nested->attribute<double>("weight"_n) = 0.5;
+  nested->attribute<base::string>("label"_n) = "inner";
+  map.attribute("nested"_n, nested);
+  map.attribute<float>("scratch"_n) = 9;
+  (*map.findAttributeMutable("scratch"_n))->flags |= base::attrNotStored;
+
+  for (bool stringIds : {false, true}) {
+    base::StringIdContext ids;
+    base::BinaryContext& context = stringIds ? ids : base::plainContext();
+    base::Stream stream = base::memStream(0);
+    map.write(stream, context);
+    stream.setPosition(0);
+    base::AttribMap copy;
+    copy.read(stream, context);
+    EXPECT_EQ(copy.size(), 3u);
+    EXPECT_EQ(copy.findAttribute<float>("scratch"_n), nullptr);
+    ASSERT_NE(copy.findVecAttribute<base::base_vec3<float>>("positions"_n), nullptr);
+    EXPECT_EQ(copy.findVecAttribute<base::base_vec3<float>>("positions"_n)->at(1), (base::base_vec3<float>{4, 5, 6}));
+    const auto* inner = static_cast<const base::AttribMap::Members*>(copy.members().back().second->data());
+    EXPECT_EQ(inner->size(), 2u);
+  }
+}
+
+// A value type that only the writer knows.
+struct Exotic : base::TypedAttribute<int> {
+  base::name_id type() const override { return "exotic"_n; }
+};
+
+TEST(AttributeBinary, AMemberOfATypeTheReaderLacksIsSkippedAlone) {
+  base::AttribFactory writerTypes;
+  writerTypes.add("exotic"_n, []() -> base::Attribute* { return new Exotic; });
+  writerTypes.add(base::TypeTraits<int>::n_name, []() -> base::Attribute* { return new base::TypedAttribute<int>; });
+  base::AttribMap written(&writerTypes);
+  written.attribute<int>("before"_n) = 1;
+  written.attribute("zz_exotic"_n, new Exotic);
+  written.attribute<int>("after"_n) = 2;
+  // Into a block stream as well, which appends every write and cannot patch anything.
+  for (std::uint32_t capabilities : {base::capsMemory, std::uint32_t(base::capWrite)}) {
+    base::vector<std::uint8_t> bytes;
+    base::Stream target = capabilities == base::capsMemory ? base::vectorStream(bytes) : base::memBlockStream();
+    written.write(target, base::plainContext());
+    if (capabilities != base::capsMemory) {
+      target.setPosition(0);
+      bytes.resize(static_cast<std::size_t>(target.getSize()));
+      target.read(bytes.data(), static_cast<std::uint32_t>(bytes.size()));
+    }
+    LogCapture capture(base::logWarning);
+    base::Stream source = base::vectorStream(static_cast<const base::vector<std::uint8_t>&>(bytes));
+    base::AttribMap read;
+    read.read(source, base::plainContext());
+    EXPECT_EQ(read.size(), 2u);
+    EXPECT_EQ(*read.findAttribute<int>("after"_n), 2);
+    EXPECT_EQ(capture.texts(),
+              (std::vector<std::string>{"factory: Trying to create am item with unknown type exotic.",
+                                        "map attribute: Attribute 'zz_exotic' has unknown type. This may be caused by "
+                                        "newer version or corrupted file. Trying to skip..."}));
+  }
+}
+
+TEST(AttributeBinary, TruncatedAndHostileInputsFailCleanly) {
+  base::AttribMap map;
+  map.attribute<base::vector<float>>("values"_n) = {1, 2, 3};
+  base::Stream stream = base::memStream(0);
+  map.write(stream, base::plainContext());
+  base::vector<std::uint8_t> bytes(static_cast<std::size_t>(stream.getSize()));
+  stream.setPosition(0);
+  stream.read(bytes.data(), static_cast<std::uint32_t>(bytes.size()));
+  // Every cut is refused with an exception, never read as garbage.
+  for (std::size_t cut = 0; cut < bytes.size(); ++cut) {
+    base::Stream shortened = base::memStream(bytes.data(), static_cast<std::int64_t>(cut));
+    base::AttribMap read;
+    EXPECT_THROW(read.read(shortened, base::plainContext()), base::exception) << cut;
+  }
+  // A count of 4,294,967,295 list elements in a few bytes allocates nothing.
+  base::vector<std::uint8_t> hostile = {0, 0xFF, 0xFF, 0xFF, 0xFF, 1, 2, 3};
+  base::TypedVectorAttribute<double> list;
+  base::Stream source = base::memStream(hostile.data(), static_cast<std::int64_t>(hostile.size()));
+  EXPECT_THROW(list.read(source, base::plainContext()), base::exception);
+  // Without a size the list grows only with the data that arrives.
+  base::Stream pipe = testing_support::fileLikeStream(std::string(hostile.begin(), hostile.end()), base::capRead);
+  EXPECT_THROW(list.read(pipe, base::plainContext()), base::exception);
+  EXPECT_LE(list.values().capacity(), 1u << 16);
+}
+
+}  // namespace
