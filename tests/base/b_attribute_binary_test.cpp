@@ -88,7 +88,7 @@ TEST(AttributeBinary, NestedMapsRoundTripWithoutMembersMarkedNotStored) {
     EXPECT_EQ(copy.findAttribute<float>("scratch"_n), nullptr);
     ASSERT_NE(copy.findVecAttribute<base::base_vec3<float>>("positions"_n), nullptr);
     EXPECT_EQ(copy.findVecAttribute<base::base_vec3<float>>("positions"_n)->at(1), (base::base_vec3<float>{4, 5, 6}));
-    const auto* inner = static_cast<const base::AttribMap::Members*>(copy.members().back().second->data());
+    const auto* inner = static_cast<const base::AttribMap::Members*>((*copy.findAttributeMutable("nested"_n))->data());
     EXPECT_EQ(inner->size(), 2u);
   }
 }

@@ -140,8 +140,8 @@ TEST(AttribMap, CopyFromModes) {
     target->attribute("nested"_n, nested);
     return target;
   };
-  const auto nestedOf = [](const base::AttribMap& map) {
-    return static_cast<const base::AttribMap::Members*>(map.members().back().second->data());
+  const auto nestedOf = [](base::AttribMap& map) {
+    return static_cast<const base::AttribMap::Members*>((*map.findAttributeMutable("nested"_n))->data());
   };
 
   auto added = makeTarget();  // mode 0: only missing names
