@@ -1,5 +1,6 @@
 #include "b_attrib_factory.h"
 
+#include "b_attrib_array.h"
 #include "b_attribute_map.h"
 #include "b_box.h"
 #include "b_color.h"
@@ -58,6 +59,7 @@ void addBuiltins(AttribFactory& factory) {
             base_box<base_vec3<float>>, base_box<base_vec3<double>>>(factory);
   addLists<base_box<base_vec3<float>>>(factory);
   factory.add(intern("map"), []() -> Attribute* { return new AttribMap; });
+  factory.add(intern("array"), []() -> Attribute* { return new AttribArray; });
 }
 
 }  // namespace

@@ -121,7 +121,6 @@ class BASE1_API AttribMap : public Attribute {
   Attribute* create(name_id type) const;
   void insert(Members::iterator at, name_id name, Attribute* attr);
   void destroyMembers();
-  static void readSized(Stream& stream, Attribute& attr, BinaryContext& context, std::uint32_t length);
 
   name_id m_mapType = nullptr;
   Members m_members;

@@ -16,6 +16,8 @@
 
 namespace base {
 
+class Attribute;
+
 static_assert(std::endian::native == std::endian::little, "the binary forms are written as the machine holds them");
 
 /// How the binary forms store names and type names.
@@ -62,6 +64,13 @@ BASE1_API std::optional<std::uint64_t> bytesLeft(Stream& stream);
 /// Reads a 32-bit count of items that take at least `itemBytes` bytes each; a count that the
 /// bytes left cannot hold throws, naming `what`.
 BASE1_API std::uint32_t readCount(Stream& stream, std::uint64_t itemBytes, std::string_view what);
+
+/// Writes the binary form of `attr` preceded by its byte length (32 bits), so that a reader
+/// that cannot read it can skip it.
+BASE1_API void writeSized(Stream& stream, const Attribute& attr, BinaryContext& context);
+/// Reads into `attr` a binary form of `length` bytes; a form that takes more throws, one
+/// that takes less has the rest skipped (where the stream can position).
+BASE1_API void readSized(Stream& stream, Attribute& attr, BinaryContext& context, std::uint32_t length);
 
 template <class T>
 void put(Stream& stream, T value) {

@@ -134,31 +134,6 @@ namespace {
 
 bool stored(const AttribMap::Member& member) { return member.second && !(member.second->flags & attrNotStored); }
 
-// Counts what is written to it and keeps nothing.
-class ByteCounter final : public StreamWorker {
- public:
-  ByteCounter() : StreamWorker(capWrite, "byte counter") {}
-  std::uint32_t write(const void*, std::uint32_t count) override {
-    total += count;
-    return count;
-  }
-  std::uint64_t total = 0;
-};
-
-// A member's binary form preceded by its byte length, which a first pass counts: no stream
-// has to go back and no form is buffered (a list's elements are counted as one block).
-void writeSized(Stream& stream, const Attribute& attr, BinaryContext& context) {
-  auto* counter = new ByteCounter;
-  Stream counting = Stream::adopt(counter);
-  attr.write(counting, context);
-  if (counter->total > 0xFFFFFFFFu) {
-    raise<exception>("base::AttribMap::write", fmt::format("A member of type '{}' takes {} bytes, more than 4 GiB",
-                                                           text(attr.type()), counter->total));
-  }
-  binary::put(stream, static_cast<std::uint32_t>(counter->total));
-  attr.write(stream, context);
-}
-
 // The least a stored member takes: two 16-bit name ids, its length and its flags byte.
 constexpr std::uint64_t smallestMember = 2 + 2 + 4 + 1;
 
@@ -171,7 +146,7 @@ void AttribMap::write(Stream& stream, BinaryContext& context) const {
     if (!stored(member)) continue;
     context.writeName(stream, member.first);
     context.writeName(stream, member.second->type());
-    writeSized(stream, *member.second, context);
+    binary::writeSized(stream, *member.second, context);
   }
 }
 
@@ -193,7 +168,7 @@ void AttribMap::read(Stream& stream, BinaryContext& context) {
       }
       continue;
     }
-    readSized(stream, *attr, context, length);
+    binary::readSized(stream, *attr, context, length);
     auto at = lowerBound(name);
     if (at != m_members.end() && at->first == name) {
       delete std::exchange(at->second, attr.release());
@@ -201,21 +176,6 @@ void AttribMap::read(Stream& stream, BinaryContext& context) {
       insert(at, name, attr.release());
     }
   }
-}
-
-void AttribMap::readSized(Stream& stream, Attribute& attr, BinaryContext& context, std::uint32_t length) {
-  if (!stream.has(capPosition)) {
-    attr.read(stream, context);
-    return;
-  }
-  const std::int64_t start = stream.getPosition();
-  attr.read(stream, context);
-  const std::int64_t used = stream.getPosition() - start;
-  if (used > length) {
-    raise<exception>("base::AttribMap::read", fmt::format("stream '{}': a member of type '{}' took {} bytes of its {}",
-                                                          clipped(stream.name()), text(attr.type()), used, length));
-  }
-  stream.setPosition(start + length);
 }
 
 void AttribMap::attribute(name_id name, Attribute* attr) {

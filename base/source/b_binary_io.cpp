@@ -1,5 +1,6 @@
 #include "b_binary_io.h"
 
+#include "b_attribute.h"
 #include "b_exception.h"
 #include "b_log.h"
 
@@ -11,6 +12,17 @@ namespace base {
 namespace {
 
 constexpr std::uint32_t longestName = 0x10000000;
+
+// Counts what is written to it and keeps nothing.
+class ByteCounter final : public StreamWorker {
+ public:
+  ByteCounter() : StreamWorker(capWrite, "byte counter") {}
+  std::uint32_t write(const void*, std::uint32_t count) override {
+    total += count;
+    return count;
+  }
+  std::uint64_t total = 0;
+};
 
 }  // namespace
 
@@ -106,6 +118,35 @@ std::uint32_t readCount(Stream& stream, std::uint64_t itemBytes, std::string_vie
                                  clipped(stream.name()), count, what, count * itemBytes, *left));
   }
   return count;
+}
+
+// A member's binary form preceded by its byte length, which a first pass counts: no stream
+// has to go back and no form is buffered (a list's elements are counted as one block).
+void writeSized(Stream& stream, const Attribute& attr, BinaryContext& context) {
+  auto* counter = new ByteCounter;
+  Stream counting = Stream::adopt(counter);
+  attr.write(counting, context);
+  if (counter->total > 0xFFFFFFFFu) {
+    raise<exception>("base::AttribMap::write", fmt::format("A member of type '{}' takes {} bytes, more than 4 GiB",
+                                                           text(attr.type()), counter->total));
+  }
+  binary::put(stream, static_cast<std::uint32_t>(counter->total));
+  attr.write(stream, context);
+}
+
+void readSized(Stream& stream, Attribute& attr, BinaryContext& context, std::uint32_t length) {
+  if (!stream.has(capPosition)) {
+    attr.read(stream, context);
+    return;
+  }
+  const std::int64_t start = stream.getPosition();
+  attr.read(stream, context);
+  const std::int64_t used = stream.getPosition() - start;
+  if (used > length) {
+    raise<exception>("base::Attribute::read", fmt::format("stream '{}': a member of type '{}' took {} bytes of its {}",
+                                                          clipped(stream.name()), text(attr.type()), used, length));
+  }
+  stream.setPosition(start + length);
 }
 
 }  // namespace binary
