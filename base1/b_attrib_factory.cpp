@@ -1,6 +1,7 @@
 #include "b_attrib_factory.h"
 
 #include "b_attrib_array.h"
+#include "b_attrib_link.h"
 #include "b_attribute_map.h"
 #include "b_box.h"
 #include "b_color.h"
@@ -60,6 +61,7 @@ void addBuiltins(AttribFactory& factory) {
   addLists<base_box<base_vec3<float>>>(factory);
   factory.add(intern("map"), []() -> Attribute* { return new AttribMap; });
   factory.add(intern("array"), []() -> Attribute* { return new AttribArray; });
+  factory.add(intern("link"), []() -> Attribute* { return new AttribLink; });
 }
 
 }  // namespace

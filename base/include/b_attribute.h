@@ -85,6 +85,9 @@ class BASE1_API Attribute : public HostAllocated {
   virtual std::uint64_t hash() const;
 
   const void* data(int index = -1) const { return const_cast<Attribute*>(this)->data(index); }
+  const AttribLink* asLink() const { return const_cast<Attribute*>(this)->asLink(); }
+  const AttribArray* asArray() const { return const_cast<Attribute*>(this)->asArray(); }
+  const AttribMap* asMap() const { return const_cast<Attribute*>(this)->asMap(); }
 
   /// Links a weak reference's node to this attribute; the caller knows it is alive.
   void attachWeak(WeakNode& node);

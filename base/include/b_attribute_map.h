@@ -118,6 +118,7 @@ class BASE1_API AttribMap : public Attribute {
   Attribute& replace(name_id name, name_id type);
   Attribute* sync(name_id name, name_id type, const void* initial);
   const void* find(name_id name, name_id type, Mismatch mismatch) const;
+  const Attribute* followLinks(name_id name, const Attribute* found) const;
   Attribute* create(name_id type) const;
   void insert(Members::iterator at, name_id name, Attribute* attr);
   void destroyMembers();

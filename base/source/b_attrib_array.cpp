@@ -109,7 +109,7 @@ std::uint32_t AttribArray::byteSize() const {
 }
 
 bool AttribArray::copyFrom(const Attribute& source, std::uint32_t mode, int) {
-  const AttribArray* from = const_cast<Attribute&>(source).asArray();
+  const AttribArray* from = source.asArray();
   if (!from || !(mode & copyOverwrite)) return false;
   setData(&from->m_elements);
   return true;

@@ -1,5 +1,6 @@
 #include "b_attribute_map.h"
 
+#include "b_attrib_link.h"
 #include "b_binary_io.h"
 #include "b_stream.h"
 
@@ -72,7 +73,7 @@ std::uint32_t AttribMap::byteSize() const {
 }
 
 bool AttribMap::copyFrom(const Attribute& source, std::uint32_t mode, int) {
-  const AttribMap* from = const_cast<Attribute&>(source).asMap();
+  const AttribMap* from = source.asMap();
   if (!from) return false;
   for (const Member& incoming : from->m_members) {
     auto at = lowerBound(incoming.first);
@@ -132,7 +133,14 @@ int AttribMap::compareData(const void* data, int index) const {
 
 namespace {
 
-bool stored(const AttribMap::Member& member) { return member.second && !(member.second->flags & attrNotStored); }
+// Left out of the stored forms: members marked so, and links into plug-in objects that are.
+bool stored(const AttribMap::Member& member) {
+  Attribute* attr = member.second;
+  if (!attr || (attr->flags & attrNotStored)) return false;
+  const AttribLink* link = attr->asLink();
+  const AttribMap* object = link ? link->path().pluginObject() : nullptr;
+  return !object || !(object->flags & attrNotStored);
+}
 
 // The least a stored member takes: two 16-bit name ids, its length and its flags byte.
 constexpr std::uint64_t smallestMember = 2 + 2 + 4 + 1;
@@ -278,9 +286,27 @@ Attribute* AttribMap::sync(name_id name, name_id type, const void* initial) {
   return existing;
 }
 
+const Attribute* AttribMap::followLinks(name_id name, const Attribute* found) const {
+  // A chain of links that comes back to itself ends here like an unresolvable one.
+  constexpr int longestChain = 64;
+  const Attribute* target = found;
+  const AttribMap* holder = this;
+  for (int hops = 0; target && target->asLink(); ++hops) {
+    const AttribLink* link = target->asLink();
+    target = hops < longestChain ? link->path().resolve(*holder, &holder) : nullptr;
+  }
+  if (!target && !(found->flags & attrSilentLink)) {
+    log().message(logSystem, logError,
+                  "map attribute| Detected invalid link attribute! Cannot resolve '{}' with value '{}'!", text(name),
+                  clipped(found->asLink()->path().toText()));
+  }
+  return target;
+}
+
 const void* AttribMap::find(name_id name, name_id type, Mismatch mismatch) const {
   requireName(name, "base::AttribMap::findAttribute");
   if (const Attribute* found = member(name)) {
+    if (found->asLink() && !(found = followLinks(name, found))) return nullptr;
     if (found->type() == type) return found->data();
     if (mismatch == Mismatch::value) {
       log().message(logSystem, logError,
