@@ -23,6 +23,12 @@ class BASE1_API AttribArray : public Attribute {
   /// Every element cloned; null stays null.
   Attribute* clone() const override;
   std::uint8_t componentType() const override { return 0xFF; }
+  /// An array: a map element as its object, null as null, any other element as
+  /// {"^value": value, "^type": "type"}.
+  void writeValue(StructuredWriter& writer) const override;
+  /// Reads the array that writeValue writes; elements of types the factory does not know
+  /// are skipped with a warning. False when an element does not fit.
+  bool readValue(StructuredReader& reader) override;
   /// The flags byte, the element count (32 bits), then per element its type name (through
   /// `context`; an empty name for null), the byte length of its binary form (32 bits) and
   /// that form.

@@ -35,8 +35,8 @@ class BASE1_API AttribPath {
 
   /// The text form: steps joined by '/', a plug-in step as '@' and its id.
   base::string toText() const;
-  /// Parses the text form; false (path unchanged) for an empty step, a bad id, or a
-  /// plug-in step after the first.
+  /// Parses the text form ("" is the empty path); false (path unchanged) for an empty step,
+  /// a bad id, or a plug-in step after the first.
   bool fromText(std::string_view text);
 
   /// The attribute the path leads to, starting from `from` for a local path; null when a
@@ -66,6 +66,9 @@ class BASE1_API AttribLink : public Attribute {
   AttribLink* asLink() override { return this; }
   Attribute* clone() const override;
   std::uint8_t componentType() const override { return 0xFF; }
+  /// The path's text form, as a string.
+  void writeValue(StructuredWriter& writer) const override;
+  bool readValue(StructuredReader& reader) override;
   /// The flags byte, the step count (32 bits), then per step: a flags byte (bit 0 local),
   /// the name through `context` and the plug-in id (32 bits).
   void write(Stream& stream, BinaryContext& context) const override;

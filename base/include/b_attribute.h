@@ -16,6 +16,8 @@ class AttribLink;
 class AttribMap;
 class BinaryContext;
 class Stream;
+class StructuredReader;
+class StructuredWriter;
 
 /// Bits of an attribute's `flags`. The low byte is the persistent part.
 enum AttributeFlag : std::uint32_t {
@@ -55,9 +57,14 @@ class BASE1_API Attribute : public HostAllocated {
   /// The scalar element type: 1 uint8, 3 uint16, 5 uint32, 6 int32, 10 float, 11 double;
   /// 0xFF for structures.
   virtual std::uint8_t componentType() const = 0;
+  /// The structured form: the value through `writer` (JSON: see b_json.h).
+  virtual void writeValue(StructuredWriter& writer) const = 0;
   /// The binary form: the persistent flags byte, then the class's value; names go through
   /// `context`. Stream failures throw.
   virtual void write(Stream& stream, BinaryContext& context) const;
+  /// Reads the structured form that writeValue gives; false (value unchanged) when the input
+  /// does not fit the type.
+  virtual bool readValue(StructuredReader& reader) = 0;
   /// Reads the binary form that write gives. A form that ends early or counts more than the
   /// stream holds throws.
   virtual void read(Stream& stream, BinaryContext& context);

@@ -34,6 +34,12 @@ class BASE1_API AttribMap : public Attribute {
   /// Same factory, flags and base map, members cloned; the map type is not copied.
   Attribute* clone() const override;
   std::uint8_t componentType() const override { return 0xFF; }
+  /// An object with a member per stored member, under the key "name^type".
+  void writeValue(StructuredWriter& writer) const override;
+  /// Reads the object that writeValue writes; members of types the factory does not know
+  /// are skipped with a warning. False when the input is no object or a member does not fit
+  /// its type (the members read before it stay).
+  bool readValue(StructuredReader& reader) override;
   /// The flags byte, the count of stored members, then per member its name and type name
   /// (through `context`), the byte length of its binary form (32 bits) and that form.
   /// Members with flags bit 31 are left out.

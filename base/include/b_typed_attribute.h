@@ -5,9 +5,12 @@
 #include "b_components.h"
 #include "b_exception.h"
 #include "b_string_conversion.h"
+#include "b_structured.h"
 #include "b_type_traits.h"
 
+#include <cmath>
 #include <cstdint>
+#include <limits>
 #include <type_traits>
 
 namespace base {
@@ -96,6 +99,92 @@ void readValue(Stream& stream, T& value) {
   }
 }
 
+template <class C>
+void writeScalar(StructuredWriter& writer, const C& value) {
+  if constexpr (std::is_same_v<C, bool> || std::is_floating_point_v<C>)
+    writer.value(value);
+  else if constexpr (std::is_signed_v<C>)
+    writer.value(static_cast<std::int64_t>(value));
+  else
+    writer.value(static_cast<std::uint64_t>(value));
+}
+
+/// Reads a number of type C; a number the type cannot hold fails: for a float, a finite
+/// number that rounds beyond the largest float (1e39), while the texts of NaN and the
+/// infinities read back as such. The bound is where rounding overflows, not the largest
+/// float itself, so that the largest float's own shortest text (3.4028235e+38) reads back.
+template <class C>
+bool readScalar(StructuredReader& reader, C& value) {
+  if constexpr (std::is_same_v<C, bool> || std::is_same_v<C, double>) {
+    return reader.value(value);
+  } else if constexpr (std::is_same_v<C, float>) {
+    double number = 0;
+    constexpr double overflows = 3.4028235677973366e38;  // the largest float plus half its last step
+    if (!reader.value(number) || (std::isfinite(number) && std::fabs(number) >= overflows)) return false;
+    value = static_cast<float>(number);
+    return true;
+  } else {
+    using Wide = std::conditional_t<std::is_signed_v<C>, std::int64_t, std::uint64_t>;
+    Wide number = 0;
+    if (!reader.value(number) || number < Wide(std::numeric_limits<C>::min()) ||
+        number > Wide(std::numeric_limits<C>::max())) {
+      return false;
+    }
+    value = static_cast<C>(number);
+    return true;
+  }
+}
+
+template <class T>
+concept Box = requires(T& value) {
+  value.min;
+  value.max;
+};
+
+/// The structured form of one value: text as a string; numbers and one-component values
+/// (time codes) as numbers; a box as [[min...], [max...]]; other values as arrays of their
+/// components.
+template <class T>
+void writeStructured(StructuredWriter& writer, const T& value) {
+  if constexpr (std::is_same_v<T, base::string>) {
+    writer.value(std::string_view(value));
+  } else if constexpr (componentCount<const T> == 1) {
+    writeScalar(writer, component<0>(value));
+  } else if constexpr (Box<T>) {
+    writer.beginArray();
+    writeStructured(writer, value.min);
+    writeStructured(writer, value.max);
+    writer.endArray();
+  } else {
+    writer.beginArray();
+    forEachComponent(value, [&writer](const auto& each) { writeScalar(writer, each); });
+    writer.endArray();
+  }
+}
+
+/// Reads what writeStructured writes into `value`; false when the input does not fit (then
+/// `value` may be partly set: callers read into a copy).
+template <class T>
+bool readStructured(StructuredReader& reader, T& value) {
+  if constexpr (std::is_same_v<T, base::string>) {
+    return reader.value(value);
+  } else if constexpr (componentCount<T> == 1) {
+    return readScalar(reader, component<0>(value));
+  } else {
+    std::size_t size = 0;
+    if (!reader.beginArray(size)) return false;
+    bool fits = true;
+    if constexpr (Box<T>) {
+      fits = size == 2 && readStructured(reader, value.min) && readStructured(reader, value.max);
+    } else {
+      fits = size == componentCount<T>;
+      forEachComponent(value, [&](auto& each) { fits = fits && readScalar(reader, each); });
+    }
+    reader.endArray();
+    return fits;
+  }
+}
+
 }  // namespace detail
 
 /// An attribute holding one value of type T.
@@ -112,9 +201,16 @@ class TypedAttribute : public Attribute {
     return copy;
   }
   std::uint8_t componentType() const override { return detail::valueCode<T>(); }
+  void writeValue(StructuredWriter& writer) const override { detail::writeStructured(writer, m_value); }
   void write(Stream& stream, BinaryContext& context) const override {
     Attribute::write(stream, context);
     detail::writeValue(stream, m_value);
+  }
+  bool readValue(StructuredReader& reader) override {
+    T value = m_value;
+    if (!detail::readStructured(reader, value)) return false;
+    m_value = value;
+    return true;
   }
   void read(Stream& stream, BinaryContext& context) override {
     Attribute::read(stream, context);
@@ -170,6 +266,21 @@ class TypedVectorAttribute : public Attribute {
     return copy;
   }
   std::uint8_t componentType() const override { return detail::valueCode<T>(); }
+  void writeValue(StructuredWriter& writer) const override {
+    writer.beginArray();
+    for (const T& value : m_values) detail::writeStructured(writer, value);
+    writer.endArray();
+  }
+  bool readValue(StructuredReader& reader) override {
+    std::size_t size = 0;
+    if (!reader.beginArray(size)) return false;
+    base::vector<T> values(size);
+    bool fits = true;
+    for (std::size_t k = 0; k < size && fits; ++k) fits = detail::readStructured(reader, values[k]);
+    reader.endArray();
+    if (fits) m_values = std::move(values);
+    return fits;
+  }
   /// The flags byte, the element count (32 bits), then the elements.
   void write(Stream& stream, BinaryContext& context) const override {
     Attribute::write(stream, context);

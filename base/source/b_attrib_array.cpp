@@ -3,6 +3,7 @@
 #include "b_binary_io.h"
 #include "b_exception.h"
 #include "b_log.h"
+#include "b_structured.h"
 
 #include <algorithm>
 #include <memory>
@@ -55,6 +56,65 @@ void AttribArray::write(Stream& stream, BinaryContext& context) const {
       binary::put(stream, std::uint32_t(0));
     }
   }
+}
+
+void AttribArray::writeValue(StructuredWriter& writer) const {
+  writer.beginArray();
+  for (const Attribute* element : m_elements) {
+    if (!element) {
+      writer.null();
+    } else if (element->asMap()) {
+      element->writeValue(writer);
+    } else {
+      writer.beginObject();
+      writer.key("^value");
+      element->writeValue(writer);
+      writer.key("^type");
+      writer.value(text(element->type()));
+      writer.endObject();
+    }
+  }
+  writer.endArray();
+}
+
+bool AttribArray::readValue(StructuredReader& reader) {
+  std::size_t size = 0;
+  if (!reader.beginArray(size)) return false;
+  Elements elements;
+  bool fits = true;
+  for (std::size_t k = 0; k < size && fits; ++k) {
+    if (reader.null()) {
+      elements.push_back(nullptr);
+      continue;
+    }
+    std::unique_ptr<Attribute> element;
+    if (reader.nextHasKey("^type")) {
+      std::size_t members = 0;
+      base::string type;
+      reader.beginObject(members);
+      fits = reader.find("^type") && reader.value(type);
+      if (fits) element.reset(m_factory->create(intern(type)));
+      if (fits && !element) {
+        log().message(logSystem, logWarning, "array attribute: Unknown attribute type '{}'. Ignoring...",
+                      clipped(type));
+      } else if (fits) {
+        fits = reader.find("^value") && element->readValue(reader);
+      }
+      reader.endObject();
+    } else {
+      element.reset(m_factory->create(intern("map")));
+      fits = element && element->readValue(reader);
+    }
+    if (fits && element) elements.push_back(element.release());
+  }
+  reader.endArray();
+  if (fits) {
+    destroyElements();
+    m_elements = std::move(elements);
+  } else {
+    for (Attribute* element : elements) delete element;
+  }
+  return fits;
 }
 
 void AttribArray::read(Stream& stream, BinaryContext& context) {

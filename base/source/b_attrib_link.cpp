@@ -2,6 +2,7 @@
 
 #include "b_attribute_map.h"
 #include "b_binary_io.h"
+#include "b_structured.h"
 
 #include <atomic>
 #include <charconv>
@@ -37,6 +38,10 @@ base::string AttribPath::toText() const {
 }
 
 bool AttribPath::fromText(std::string_view text) {
+  if (text.empty()) {
+    m_steps.clear();
+    return true;
+  }
   base::vector<Step> steps;
   for (std::size_t start = 0; start <= text.size();) {
     const std::size_t end = std::min(text.find('/', start), text.size());
@@ -102,6 +107,13 @@ Attribute* AttribLink::clone() const {
   copy->flags = flags;
   copy->setPath(m_path);
   return copy;
+}
+
+void AttribLink::writeValue(StructuredWriter& writer) const { writer.value(std::string_view(m_path.toText())); }
+
+bool AttribLink::readValue(StructuredReader& reader) {
+  base::string text;
+  return reader.value(text) && fromString(text);
 }
 
 void AttribLink::write(Stream& stream, BinaryContext& context) const {

@@ -3,6 +3,7 @@
 #include "b_attrib_link.h"
 #include "b_binary_io.h"
 #include "b_stream.h"
+#include "b_structured.h"
 
 #include "b_exception.h"
 #include "b_log.h"
@@ -156,6 +157,50 @@ void AttribMap::write(Stream& stream, BinaryContext& context) const {
     context.writeName(stream, member.second->type());
     binary::writeSized(stream, *member.second, context);
   }
+}
+
+void AttribMap::writeValue(StructuredWriter& writer) const {
+  writer.beginObject();
+  for (const Member& member : m_members) {
+    if (!stored(member)) continue;
+    base::string key(text(member.first));
+    key += '^';
+    key += text(member.second->type());
+    writer.key(key);
+    member.second->writeValue(writer);
+  }
+  writer.endObject();
+}
+
+bool AttribMap::readValue(StructuredReader& reader) {
+  std::size_t size = 0;
+  if (!reader.beginObject(size)) return false;
+  bool fits = true;
+  for (base::string key; fits && reader.key(key);) {
+    // Type names hold no '^'; member names may.
+    const std::size_t mark = key.rfind('^');
+    const name_id name = intern(std::string_view(key).substr(0, mark));
+    std::unique_ptr<Attribute> attr(mark == base::string::npos ? nullptr
+                                                               : m_factory->create(intern(key.substr(mark + 1))));
+    if (!attr) {
+      log().message(logSystem, logWarning,
+                    "map attribute: Attribute '{}' has unknown type. This may be caused by newer version or "
+                    "corrupted file. Trying to skip...",
+                    clipped(text(name)));
+      reader.skip();
+      continue;
+    }
+    fits = !text(name).empty() && attr->readValue(reader);
+    if (!fits) break;
+    auto at = lowerBound(name);
+    if (at != m_members.end() && at->first == name) {
+      delete std::exchange(at->second, attr.release());
+    } else {
+      insert(at, name, attr.release());
+    }
+  }
+  reader.endObject();
+  return fits;
 }
 
 void AttribMap::read(Stream& stream, BinaryContext& context) {

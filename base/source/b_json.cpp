@@ -1,0 +1,214 @@
+#include "b_json.h"
+
+#include "b_exception.h"
+
+#include <fmt/format.h>
+#include <rapidjson/document.h>
+#include <rapidjson/error/en.h>
+#include <rapidjson/stringbuffer.h>
+#include <rapidjson/writer.h>
+
+#include <cmath>
+#include <limits>
+#include <vector>
+
+namespace base {
+
+StructuredWriter::~StructuredWriter() = default;
+StructuredReader::~StructuredReader() = default;
+
+struct JsonWriter::Impl {
+  rapidjson::StringBuffer buffer;
+  rapidjson::Writer<rapidjson::StringBuffer> writer{buffer};
+
+  template <class T>
+  void real(T number) {
+    if (std::isnan(number)) {
+      writer.String("NaN");
+    } else if (std::isinf(number)) {
+      writer.String(number > 0 ? "Infinity" : "-Infinity");
+    } else if (number == 0 && std::signbit(number)) {
+      writer.RawValue("-0.0", 4, rapidjson::kNumberType);  // "-0" would read back as the integer 0
+    } else {
+      // The shortest text that reads back to the same value of the type itself.
+      const std::string text = fmt::format("{}", number);
+      writer.RawValue(text.data(), text.size(), rapidjson::kNumberType);
+    }
+  }
+};
+
+JsonWriter::JsonWriter() : m_impl(std::make_unique<Impl>()) {}
+JsonWriter::~JsonWriter() = default;
+
+std::string_view JsonWriter::text() const { return {m_impl->buffer.GetString(), m_impl->buffer.GetSize()}; }
+void JsonWriter::beginObject() { m_impl->writer.StartObject(); }
+void JsonWriter::key(std::string_view name) {
+  m_impl->writer.Key(name.data(), static_cast<rapidjson::SizeType>(name.size()), true);
+}
+void JsonWriter::endObject() { m_impl->writer.EndObject(); }
+void JsonWriter::beginArray() { m_impl->writer.StartArray(); }
+void JsonWriter::endArray() { m_impl->writer.EndArray(); }
+void JsonWriter::null() { m_impl->writer.Null(); }
+void JsonWriter::value(bool value) { m_impl->writer.Bool(value); }
+void JsonWriter::value(std::int64_t value) { m_impl->writer.Int64(value); }
+void JsonWriter::value(std::uint64_t value) { m_impl->writer.Uint64(value); }
+void JsonWriter::value(float value) { m_impl->real(value); }
+void JsonWriter::value(double value) { m_impl->real(value); }
+void JsonWriter::value(std::string_view text) {
+  m_impl->writer.String(text.data(), static_cast<rapidjson::SizeType>(text.size()), true);
+}
+
+// A cursor over the parsed document: the value to be read next is the root, the next element
+// of the innermost array, or the value of the innermost object's current member.
+struct JsonReader::Impl {
+  struct Frame {
+    const rapidjson::Value* container;
+    rapidjson::SizeType index = 0;
+    const rapidjson::Value* member = nullptr;  ///< objects: the value after key()
+  };
+
+  rapidjson::Document document;
+  std::vector<Frame> frames;
+  bool rootTaken = false;
+
+  const rapidjson::Value* current() const {
+    if (frames.empty()) return rootTaken ? nullptr : &document;
+    const Frame& top = frames.back();
+    if (top.container->IsArray()) {
+      return top.index < top.container->Size() ? &(*top.container)[top.index] : nullptr;
+    }
+    return top.member;
+  }
+
+  void consume() {
+    if (frames.empty()) {
+      rootTaken = true;
+    } else if (frames.back().container->IsArray()) {
+      ++frames.back().index;
+    } else {
+      frames.back().member = nullptr;
+    }
+  }
+
+  template <class Test>
+  const rapidjson::Value* take(Test test) {
+    const rapidjson::Value* next = current();
+    if (!next || !test(*next)) return nullptr;
+    consume();
+    return next;
+  }
+
+  bool enter(bool array, std::size_t& size) {
+    if (frames.size() >= deepest) return false;
+    const rapidjson::Value* next =
+        take([array](const rapidjson::Value& v) { return array ? v.IsArray() : v.IsObject(); });
+    if (!next) return false;
+    size = array ? next->Size() : next->MemberCount();
+    frames.push_back({next});
+    return true;
+  }
+};
+
+JsonReader::JsonReader(std::string_view text) : m_impl(std::make_unique<Impl>()) {
+  m_impl->document.Parse<rapidjson::kParseFullPrecisionFlag | rapidjson::kParseIterativeFlag>(text.data(), text.size());
+  if (m_impl->document.HasParseError()) {
+    raise<exception>("base::JsonReader::JsonReader",
+                     fmt::format("JSON parse error at byte {}: {}", m_impl->document.GetErrorOffset(),
+                                 rapidjson::GetParseError_En(m_impl->document.GetParseError())));
+  }
+}
+
+JsonReader::~JsonReader() = default;
+
+bool JsonReader::beginObject(std::size_t& size) { return m_impl->enter(/*array=*/false, size); }
+
+bool JsonReader::key(base::string& name) {
+  if (m_impl->frames.empty() || !m_impl->frames.back().container->IsObject()) return false;
+  Impl::Frame& top = m_impl->frames.back();
+  if (top.index >= top.container->MemberCount()) return false;
+  const auto& member = top.container->MemberBegin()[top.index++];
+  name.assign(member.name.GetString(), member.name.GetStringLength());
+  top.member = &member.value;
+  return true;
+}
+
+void JsonReader::endObject() {
+  if (!m_impl->frames.empty()) m_impl->frames.pop_back();
+}
+bool JsonReader::beginArray(std::size_t& size) { return m_impl->enter(/*array=*/true, size); }
+void JsonReader::endArray() {
+  if (!m_impl->frames.empty()) m_impl->frames.pop_back();
+}
+bool JsonReader::null() {
+  return m_impl->take([](const rapidjson::Value& v) { return v.IsNull(); }) != nullptr;
+}
+
+bool JsonReader::value(bool& value) {
+  const auto* next = m_impl->take([](const rapidjson::Value& v) { return v.IsBool(); });
+  if (next) value = next->GetBool();
+  return next != nullptr;
+}
+
+bool JsonReader::value(std::int64_t& value) {
+  const auto* next = m_impl->take([](const rapidjson::Value& v) { return v.IsInt64(); });
+  if (next) value = next->GetInt64();
+  return next != nullptr;
+}
+
+bool JsonReader::value(std::uint64_t& value) {
+  const auto* next = m_impl->take([](const rapidjson::Value& v) { return v.IsUint64(); });
+  if (next) value = next->GetUint64();
+  return next != nullptr;
+}
+
+bool JsonReader::value(double& value) {
+  const auto special = [](const rapidjson::Value& v, double& number) {
+    const std::string_view text(v.GetString(), v.GetStringLength());
+    if (text == "NaN")
+      number = std::numeric_limits<double>::quiet_NaN();
+    else if (text == "Infinity")
+      number = std::numeric_limits<double>::infinity();
+    else if (text == "-Infinity")
+      number = -std::numeric_limits<double>::infinity();
+    else
+      return false;
+    return true;
+  };
+  double number = 0;
+  const auto* next = m_impl->take([&](const rapidjson::Value& v) {
+    if (v.IsNumber()) {
+      number = v.GetDouble();
+      return true;
+    }
+    return v.IsString() && special(v, number);
+  });
+  if (next) value = number;
+  return next != nullptr;
+}
+
+bool JsonReader::value(base::string& text) {
+  const auto* next = m_impl->take([](const rapidjson::Value& v) { return v.IsString(); });
+  if (next) text.assign(next->GetString(), next->GetStringLength());
+  return next != nullptr;
+}
+
+bool JsonReader::nextHasKey(std::string_view name) const {
+  const rapidjson::Value* next = m_impl->current();
+  return next && next->IsObject() &&
+         next->FindMember(rapidjson::Value(rapidjson::StringRef(name.data(), name.size()))) != next->MemberEnd();
+}
+
+bool JsonReader::find(std::string_view name) {
+  if (m_impl->frames.empty() || !m_impl->frames.back().container->IsObject()) return false;
+  Impl::Frame& top = m_impl->frames.back();
+  const auto found = top.container->FindMember(rapidjson::Value(rapidjson::StringRef(name.data(), name.size())));
+  if (found == top.container->MemberEnd()) return false;
+  top.member = &found->value;
+  return true;
+}
+
+void JsonReader::skip() {
+  if (m_impl->current()) m_impl->consume();
+}
+
+}  // namespace base
