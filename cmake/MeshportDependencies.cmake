@@ -22,6 +22,8 @@ else()
   find_package(fmt REQUIRED)
   find_package(CLI11 REQUIRED)
   find_path(MESHPORT_RAPIDJSON_INCLUDE rapidjson/document.h REQUIRED)
+  find_path(MESHPORT_MURMURHASH_INCLUDE murmurhash.h REQUIRED)
+  find_library(MESHPORT_MURMURHASH_LIBRARY murmurhash REQUIRED)
 endif()
 # Header-only, used by scenetool alone; never part of the installed package.
 add_library(meshport_rapidjson INTERFACE)

@@ -12,7 +12,7 @@ namespace base {
 
 /// A running hash that a stream can feed with the blocks it reads.
 class BASE1_API Hash : public HostAllocated {
-public:
+ public:
   virtual ~Hash();
   virtual void update(const void* data, std::size_t size) = 0;
   /// A new hash in the same state.
@@ -21,5 +21,9 @@ public:
   virtual void reset() = 0;
   virtual base::vector<std::uint8_t> digest() const = 0;
 };
+
+/// The first 64 bits of the MurmurHash3 (x86, 128-bit) digest of `size` bytes with seed 0.
+/// Where the build has no MurmurHash3 library (the Windows cross build, for now), 0.
+BASE1_API std::uint64_t murmurHash3(const void* data, std::size_t size);
 
 }  // namespace base

@@ -4,6 +4,7 @@
 #include "b_binary_io.h"
 #include "b_components.h"
 #include "b_exception.h"
+#include "b_hash.h"
 #include "b_string_conversion.h"
 #include "b_structured.h"
 #include "b_type_traits.h"
@@ -346,6 +347,21 @@ class TypedVectorAttribute : public Attribute {
       if (const int order = detail::compareValues(m_values[k], other[k]); order != 0) return order;
     }
     return 0;
+  }
+
+  /// MurmurHash3 (x86, 128-bit, seed 0) of the elements' bytes, as the binary form holds
+  /// them; its first 64 bits.
+  std::uint64_t hash() const override {
+    if constexpr (packed) {
+      return murmurHash3(m_values.data(), m_values.size() * sizeof(T));
+    } else {
+      Stream bytes = memStream(0);
+      for (const T& value : m_values) detail::writeValue(bytes, value);
+      std::int64_t offset = 0;
+      std::int64_t size = 0;
+      const std::uint8_t* block = bytes.worker()->getMemory(&offset, &size);
+      return murmurHash3(block ? block + offset : nullptr, static_cast<std::size_t>(size));
+    }
   }
 
   const base::vector<T>& values() const { return m_values; }

@@ -154,4 +154,27 @@ TEST(AttributeBinary, TruncatedAndHostileInputsFailCleanly) {
   EXPECT_LE(list.values().capacity(), 1u << 16);
 }
 
+TEST(AttributeHash, ListsHashTheBytesOfTheirBinaryForm) {
+  base::TypedVectorAttribute<float> empty;
+  EXPECT_EQ(empty.hash(), 0u);  // MurmurHash3 of no bytes with seed 0
+  base::TypedVectorAttribute<float> a;
+  a.values() = {1, 2, 3};
+  base::TypedVectorAttribute<float> b;
+  b.values() = {1, 2, 3};
+  EXPECT_EQ(a.hash(), b.hash());
+  EXPECT_NE(a.hash(), 0u);
+  b.values()[2] = 4;
+  EXPECT_NE(a.hash(), b.hash());
+  // A padded element hashes as the binary form holds it, not its padding.
+  base::TypedVectorAttribute<base::detail::mat43f_type> transforms;
+  transforms.values().resize(2);
+  base::Stream form = base::memStream(0);
+  for (const auto& value : transforms.values()) base::detail::writeValue(form, value);
+  base::vector<std::uint8_t> bytes(static_cast<std::size_t>(form.getSize()));
+  form.setPosition(0);
+  form.read(bytes.data(), static_cast<std::uint32_t>(bytes.size()));
+  EXPECT_EQ(transforms.hash(), base::murmurHash3(bytes.data(), bytes.size()));
+  EXPECT_EQ(base::TypedAttribute<float>(1).hash(), 0u);
+}
+
 }  // namespace
