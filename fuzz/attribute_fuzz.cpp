@@ -1,0 +1,37 @@
+// Feeds arbitrary bytes to the attribute readers: the binary form of a map (plain names and
+// string ids, from memory and from a stream without a size) and the JSON form.
+
+#include "b_attribute_map.h"
+#include "b_binary_io.h"
+#include "b_exception.h"
+#include "b_json.h"
+#include "b_log.h"
+
+#include <cstddef>
+#include <cstdint>
+#include <string_view>
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
+  base::log().setLevel(0);
+  for (bool stringIds : {false, true}) {
+    base::StringIdContext ids;
+    ids.setTable({base::intern("a"), base::intern("int32"), base::intern("map"), base::intern("float[]")});
+    base::BinaryContext& context = stringIds ? static_cast<base::BinaryContext&>(ids) : base::plainContext();
+    base::Stream stream = base::memStream(data, static_cast<std::int64_t>(size), "fuzz");
+    base::AttribMap map;
+    try {
+      map.read(stream, context);
+      base::Stream out = base::memStream(0);
+      map.write(out, context);
+    } catch (const base::exception&) {
+      // Refusing bad input is the point; crashing or hanging is the fault.
+    }
+  }
+  try {
+    base::JsonReader reader(std::string_view(reinterpret_cast<const char*>(data), size));
+    base::AttribMap map;
+    map.readValue(reader);
+  } catch (const base::exception&) {
+  }
+  return 0;
+}
