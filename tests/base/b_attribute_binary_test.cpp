@@ -14,7 +14,9 @@
 #include "test_streams.h"
 
 #include <gtest/gtest.h>
+#include <murmurhash.h>
 
+#include <cstring>
 #include <memory>
 
 namespace {
@@ -152,6 +154,23 @@ TEST(AttributeBinary, TruncatedAndHostileInputsFailCleanly) {
   base::Stream pipe = testing_support::fileLikeStream(std::string(hostile.begin(), hostile.end()), base::capRead);
   EXPECT_THROW(list.read(pipe, base::plainContext()), base::exception);
   EXPECT_LE(list.values().capacity(), 1u << 16);
+}
+
+// The library is MurmurHash3 x86 128-bit: its published verification value (each prefix of
+// 0..255 hashed with seed 256 - length, then the digests hashed) must come out.
+TEST(AttributeHash, TheLibraryIsMurmurHash3X86_128) {
+  std::uint8_t key[256];
+  std::uint32_t digests[256][4];
+  for (int length = 0; length < 256; ++length) {
+    key[length] = static_cast<std::uint8_t>(length);
+    lmmh_x86_128(key, static_cast<unsigned>(length), static_cast<std::uint32_t>(256 - length), digests[length]);
+  }
+  std::uint32_t verification[4];
+  lmmh_x86_128(digests, sizeof digests, 0, verification);
+  EXPECT_EQ(verification[0], 0xB3ECE62Au);
+  // hash() is the digest's first 64 bits with seed 0.
+  const char* text = "The quick brown fox jumps over the lazy dog";
+  EXPECT_EQ(base::murmurHash3(text, std::strlen(text)), 0xecee2c672f1583c3u);
 }
 
 TEST(AttributeHash, ListsHashTheBytesOfTheirBinaryForm) {
