@@ -11,75 +11,31 @@
 #include <cstring>
 #include <limits>
 #include <optional>
+#include <tuple>
 #include <type_traits>
 
 namespace ply::detail {
 
+/// The C++ type of each data type, in the order of DataType.
+using NativeTypes =
+    std::tuple<std::int8_t, std::uint8_t, std::int16_t, std::uint16_t, std::int32_t, std::uint32_t, float, double>;
 template <DataType T>
-struct Native;
-template <>
-struct Native<DataType::int8> {
-  using type = std::int8_t;
-};
-template <>
-struct Native<DataType::uint8> {
-  using type = std::uint8_t;
-};
-template <>
-struct Native<DataType::int16> {
-  using type = std::int16_t;
-};
-template <>
-struct Native<DataType::uint16> {
-  using type = std::uint16_t;
-};
-template <>
-struct Native<DataType::int32> {
-  using type = std::int32_t;
-};
-template <>
-struct Native<DataType::uint32> {
-  using type = std::uint32_t;
-};
-template <>
-struct Native<DataType::float32> {
-  using type = float;
-};
-template <>
-struct Native<DataType::float64> {
-  using type = double;
-};
-template <DataType T>
-using NativeType = typename Native<T>::type;
+using NativeType = std::tuple_element_t<static_cast<std::size_t>(T), NativeTypes>;
 
 inline std::uint8_t swapBytes(std::uint8_t value) { return value; }
 inline std::uint16_t swapBytes(std::uint16_t value) { return __builtin_bswap16(value); }
 inline std::uint32_t swapBytes(std::uint32_t value) { return __builtin_bswap32(value); }
 inline std::uint64_t swapBytes(std::uint64_t value) { return __builtin_bswap64(value); }
 
+/// The unsigned integer type of `Size` bytes (1, 2, 4 or 8).
 template <std::size_t Size>
-struct UnsignedOfSize;
-template <>
-struct UnsignedOfSize<1> {
-  using type = std::uint8_t;
-};
-template <>
-struct UnsignedOfSize<2> {
-  using type = std::uint16_t;
-};
-template <>
-struct UnsignedOfSize<4> {
-  using type = std::uint32_t;
-};
-template <>
-struct UnsignedOfSize<8> {
-  using type = std::uint64_t;
-};
+using UnsignedOfSize = std::tuple_element_t<std::bit_width(Size) - 1,
+                                            std::tuple<std::uint8_t, std::uint16_t, std::uint32_t, std::uint64_t>>;
 
 /// The value of type T stored at `bytes`, byte-swapped when `Swap`.
 template <class T, bool Swap>
 inline T loadAs(const std::uint8_t* bytes) {
-  using Raw = typename UnsignedOfSize<sizeof(T)>::type;
+  using Raw = UnsignedOfSize<sizeof(T)>;
   Raw raw;
   std::memcpy(&raw, bytes, sizeof raw);
   if constexpr (Swap) raw = swapBytes(raw);

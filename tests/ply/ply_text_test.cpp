@@ -32,8 +32,8 @@ T exact(const std::string& word) {
 template <ply::DataType Type>
 void expectExact(const std::string& word) {
   using T = ply::detail::Held<Type>;
-  EXPECT_EQ(std::bit_cast<typename ply::detail::UnsignedOfSize<sizeof(T)>::type>(ply::parseAsciiHeld<Type>(word)),
-            std::bit_cast<typename ply::detail::UnsignedOfSize<sizeof(T)>::type>(exact<T>(word)))
+  EXPECT_EQ(std::bit_cast<ply::detail::UnsignedOfSize<sizeof(T)>>(ply::parseAsciiHeld<Type>(word)),
+            std::bit_cast<ply::detail::UnsignedOfSize<sizeof(T)>>(exact<T>(word)))
       << word;
 }
 
