@@ -15,7 +15,8 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   base::log().setLevel(0);
   for (bool stringIds : {false, true}) {
     base::StringIdContext ids;
-    ids.setTable({base::intern("a"), base::intern("int32"), base::intern("map"), base::intern("float[]")});
+    ids.names.setNames({base::intern("a"), base::intern("b")});
+    ids.types.setNames({base::intern("int32"), base::intern("map"), base::intern("float[]"), base::intern("array")});
     base::BinaryContext& context = stringIds ? static_cast<base::BinaryContext&>(ids) : base::plainContext();
     base::Stream stream = base::memStream(data, static_cast<std::int64_t>(size), "fuzz");
     base::AttribMap map;

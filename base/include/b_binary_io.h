@@ -20,31 +20,50 @@ class Attribute;
 
 static_assert(std::endian::native == std::endian::little, "the binary forms are written as the machine holds them");
 
-/// How the binary forms store names and type names.
+/// How the binary forms store member names, type names and references to plug-in objects.
 class BASE1_API BinaryContext {
  public:
   virtual ~BinaryContext();
-  /// The plain form: the text's byte length (32 bits), then its bytes.
+  /// A member name. The plain form: the text's byte length (32 bits), then its bytes.
   virtual void writeName(Stream& stream, name_id name);
   /// Reads a name of the plain form. A length over 256 MiB, or over what the stream has
   /// left, throws.
   virtual name_id readName(Stream& stream);
+  /// A type name; the plain form is that of names.
+  virtual void writeType(Stream& stream, name_id type);
+  virtual name_id readType(Stream& stream);
+  /// The id under which a reference to the plug-in object listed at `index` is stored;
+  /// plainly the index itself.
+  virtual std::uint32_t pluginId(std::uint32_t index) const;
 };
 
-/// Names as 16-bit ids of a string table that the context keeps and its user stores.
-class BASE1_API StringIdContext : public BinaryContext {
+/// A table of names stored elsewhere, each name stored as its 16-bit position in it.
+class BASE1_API NameTable {
  public:
   /// Writes the name's id, giving new names the next id; more than 65,536 names throw.
-  void writeName(Stream& stream, name_id name) override;
+  void write(Stream& stream, name_id name);
   /// Reads an id; one outside the table throws.
-  name_id readName(Stream& stream) override;
+  name_id read(Stream& stream) const;
 
-  const base::vector<name_id>& table() const { return m_table; }
-  void setTable(base::vector<name_id> table);
+  const base::vector<name_id>& names() const { return m_names; }
+  void setNames(base::vector<name_id> names);
 
  private:
-  base::vector<name_id> m_table;
+  base::vector<name_id> m_names;
   base::map<name_id, std::uint16_t> m_ids;
+};
+
+/// Member names and type names as 16-bit ids of two tables that the context keeps and its
+/// user stores.
+class BASE1_API StringIdContext : public BinaryContext {
+ public:
+  void writeName(Stream& stream, name_id name) override { names.write(stream, name); }
+  name_id readName(Stream& stream) override { return names.read(stream); }
+  void writeType(Stream& stream, name_id type) override { types.write(stream, type); }
+  name_id readType(Stream& stream) override { return types.read(stream); }
+
+  NameTable names;
+  NameTable types;
 };
 
 /// The plain context, for callers that need no string table.

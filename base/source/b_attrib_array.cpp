@@ -49,7 +49,7 @@ void AttribArray::write(Stream& stream, BinaryContext& context) const {
   Attribute::write(stream, context);
   binary::put(stream, static_cast<std::uint32_t>(m_elements.size()));
   for (const Attribute* element : m_elements) {
-    context.writeName(stream, element ? element->type() : noType());
+    context.writeType(stream, element ? element->type() : noType());
     if (element) {
       binary::writeSized(stream, *element, context);
     } else {
@@ -124,7 +124,7 @@ void AttribArray::read(Stream& stream, BinaryContext& context) {
   for (std::uint32_t k = 0; k < count; ++k) {
     name_id type = nullptr;
     try {
-      type = context.readName(stream);
+      type = context.readType(stream);
     } catch (const exception&) {
       log().message(logSystem, logError,
                     "array attribute: Unable to read the attribute type inside! Probably a corrupted file!");

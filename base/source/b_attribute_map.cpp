@@ -154,7 +154,7 @@ void AttribMap::write(Stream& stream, BinaryContext& context) const {
   for (const Member& member : m_members) {
     if (!stored(member)) continue;
     context.writeName(stream, member.first);
-    context.writeName(stream, member.second->type());
+    context.writeType(stream, member.second->type());
     binary::writeSized(stream, *member.second, context);
   }
 }
@@ -208,7 +208,7 @@ void AttribMap::read(Stream& stream, BinaryContext& context) {
   const std::uint32_t count = binary::readCount(stream, smallestMember, "map members");
   for (std::uint32_t k = 0; k < count; ++k) {
     const name_id name = context.readName(stream);
-    const name_id type = context.readName(stream);
+    const name_id type = context.readType(stream);
     const std::uint32_t length = binary::readCount(stream, 1, "member bytes");
     std::unique_ptr<Attribute> attr(m_factory->create(type));
     if (!attr) {

@@ -47,29 +47,35 @@ name_id BinaryContext::readName(Stream& stream) {
   return intern(bytes);
 }
 
-void StringIdContext::writeName(Stream& stream, name_id name) {
+void BinaryContext::writeType(Stream& stream, name_id type) { BinaryContext::writeName(stream, type); }
+
+name_id BinaryContext::readType(Stream& stream) { return BinaryContext::readName(stream); }
+
+std::uint32_t BinaryContext::pluginId(std::uint32_t index) const { return index; }
+
+void NameTable::write(Stream& stream, name_id name) {
   auto found = m_ids.find(name);
   if (found == m_ids.end()) {
-    if (m_table.size() > 0xFFFF) raise<exception>("base::StringIdContext::writeName", "More than 65536 names to store");
-    found = m_ids.emplace(name, static_cast<std::uint16_t>(m_table.size())).first;
-    base::append(m_table, name);
+    if (m_names.size() > 0xFFFF) raise<exception>("base::NameTable::write", "More than 65536 names to store");
+    found = m_ids.emplace(name, static_cast<std::uint16_t>(m_names.size())).first;
+    base::append(m_names, name);
   }
   binary::put(stream, found->second);
 }
 
-name_id StringIdContext::readName(Stream& stream) {
+name_id NameTable::read(Stream& stream) const {
   const auto id = binary::get<std::uint16_t>(stream);
-  if (id >= m_table.size()) {
-    raise<exception>("base::StringIdContext::readName",
-                     fmt::format("Name id {} is not in the table of {} names", id, m_table.size()));
+  if (id >= m_names.size()) {
+    raise<exception>("base::NameTable::read",
+                     fmt::format("Name id {} is not in the table of {} names", id, m_names.size()));
   }
-  return m_table[id];
+  return m_names[id];
 }
 
-void StringIdContext::setTable(base::vector<name_id> table) {
-  m_table = std::move(table);
+void NameTable::setNames(base::vector<name_id> names) {
+  m_names = std::move(names);
   m_ids.clear();
-  for (std::size_t k = 0; k < m_table.size(); ++k) m_ids.emplace(m_table[k], static_cast<std::uint16_t>(k));
+  for (std::size_t k = 0; k < m_names.size(); ++k) m_ids.emplace(m_names[k], static_cast<std::uint16_t>(k));
 }
 
 BinaryContext& plainContext() {
