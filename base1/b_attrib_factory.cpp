@@ -8,6 +8,7 @@
 #include "b_log.h"
 #include "b_matrix.h"
 #include "b_normal.h"
+#include "b_plugin_attribute.h"
 #include "b_quat.h"
 #include "b_timecode.h"
 #include "b_typed_attribute.h"
@@ -62,6 +63,8 @@ void addBuiltins(AttribFactory& factory) {
   factory.add(intern("map"), []() -> Attribute* { return new AttribMap; });
   factory.add(intern("array"), []() -> Attribute* { return new AttribArray; });
   factory.add(intern("link"), []() -> Attribute* { return new AttribLink; });
+  factory.add(TypeTraits<ref<IPlugin>>::n_name, []() -> Attribute* { return new PluginAttribute; });
+  factory.add(TypeTraits<ref<IPlugin>>::n_array_name, []() -> Attribute* { return new PluginVectorAttribute; });
 }
 
 }  // namespace

@@ -25,7 +25,10 @@ class BASE1_API AttribPath {
   static constexpr std::uint32_t noPlugin = 0xFFFFFFFF;
 
   /// Finds the map of a plug-in object by its id; null when there is none.
-  using PluginResolver = AttribMap* (*)(std::uint32_t id);
+  /// Finds the map of the plug-in object with id `id`, as seen from the map `from` that
+  /// holds the link (the plug-in factory looks in the factory of `from`); null when there is
+  /// none.
+  using PluginResolver = AttribMap* (*)(const AttribMap& from, std::uint32_t id);
   /// Sets the resolver for plug-in steps (the plug-in factory's); null for none.
   static void setPluginResolver(PluginResolver resolver);
 
@@ -45,7 +48,7 @@ class BASE1_API AttribPath {
 
   /// The plug-in object that a path starting at one starts at; null for local paths and
   /// objects that do not resolve.
-  AttribMap* pluginObject() const;
+  AttribMap* pluginObject(const AttribMap& from) const;
 
   /// The link that owns the path, or null.
   AttribLink* owner = nullptr;
@@ -80,9 +83,6 @@ class BASE1_API AttribLink : public Attribute {
   bool copyFrom(const Attribute& source, std::uint32_t mode, int index = -1) override;
   base::string toString() const override { return m_path.toText(); }
   bool fromString(std::string_view text) override;
-  /// Whether the target of a path that starts at a plug-in object is marked; false for
-  /// local paths and short paths.
-  bool hasRuntimeFlag() const override;
   /// `data` is an AttribPath.
   void setData(const void* data, int index = -1) override;
   /// 0 for the same path, else 1.

@@ -47,9 +47,25 @@ class BASE1_API PluginFactory : public RefCntAtomic {
   /// descriptor gives null.
   ref<IPlugin> create(name_id type, std::uint32_t flags = 0);
 
-  /// Empties slot `index`, dropping the list's reference. False, logged, for an index
+  /// Tells every listed object to refer to object `newIndex` (none for 0xFFFFFFFF) wherever
+  /// it refers to object `oldIndex`; false, logged, when `oldIndex` holds no object or
+  /// `newIndex` is outside the list.
+  bool replace(std::uint32_t oldIndex, std::uint32_t newIndex);
+  /// Empties slot `index`, dropping the list's reference; with `dropReferences` the other
+  /// objects' references to it are replaced by none first. False, logged, for an index
   /// outside the list or an empty slot (nothing logged for 0xFFFFFFFF).
-  bool remove(std::uint32_t index);
+  bool remove(std::uint32_t index, bool dropReferences = false);
+
+  /// Writes the object list as an object-list file (see docs/formats.md): the plug-in type,
+  /// attribute type and name tables, then each listed object that is stored (not empty, no
+  /// flags bit 31) with its type index and attribute map. References between objects are
+  /// stored as positions in the written list. Stream failures throw.
+  void write(Stream& stream);
+  /// Appends the objects of an object-list file. Version, size and table errors throw; a bad
+  /// type record stops the read with an error message and keeps the objects read so far;
+  /// unknown plug-in types become general objects, unknown attribute types are skipped.
+  /// References are bound to the objects of this read at the end.
+  void read(Stream& stream);
 
   /// The listed object at `index`, or null.
   IPlugin* object(std::uint32_t index) const;
@@ -61,6 +77,7 @@ class BASE1_API PluginFactory : public RefCntAtomic {
 
  private:
   IPluginDesc* descriptorFor(name_id type, std::uint32_t flags);
+  IPluginDesc* dummyFor(name_id type);
 
   AttribMap m_ownAttributes;
   base::map<name_id, ref<IPluginDesc>> m_descriptors;

@@ -64,17 +64,17 @@ bool AttribPath::fromText(std::string_view text) {
   return true;
 }
 
-AttribMap* AttribPath::pluginObject() const {
+AttribMap* AttribPath::pluginObject(const AttribMap& from) const {
   if (m_steps.empty() || m_steps.front().local) return nullptr;
   const PluginResolver resolver = pluginResolver.load();
-  return resolver ? resolver(m_steps.front().plugin) : nullptr;
+  return resolver ? resolver(from, m_steps.front().plugin) : nullptr;
 }
 
 Attribute* AttribPath::resolve(const AttribMap& from, const AttribMap** container) const {
   const AttribMap* map = &from;
   std::size_t first = 0;
   if (!m_steps.empty() && !m_steps.front().local) {
-    map = pluginObject();
+    map = pluginObject(from);
     first = 1;
     if (!map) return nullptr;
   }
@@ -157,15 +157,6 @@ bool AttribLink::fromString(std::string_view text) {
   if (!path.fromText(text)) return false;
   setPath(path);
   return true;
-}
-
-bool AttribLink::hasRuntimeFlag() const {
-  if (Attribute::hasRuntimeFlag()) return true;
-  const auto& steps = m_path.steps();
-  if (steps.size() < 2 || steps.front().local) return false;
-  const AttribMap* start = m_path.pluginObject();
-  const Attribute* target = start ? m_path.resolve(*start) : nullptr;
-  return target && target->hasRuntimeFlag();
 }
 
 void AttribLink::setData(const void* data, int) { setPath(*static_cast<const AttribPath*>(data)); }

@@ -135,11 +135,11 @@ int AttribMap::compareData(const void* data, int index) const {
 namespace {
 
 // Left out of the stored forms: members marked so, and links into plug-in objects that are.
-bool stored(const AttribMap::Member& member) {
+bool stored(const AttribMap& map, const AttribMap::Member& member) {
   Attribute* attr = member.second;
   if (!attr || (attr->flags & attrNotStored)) return false;
   const AttribLink* link = attr->asLink();
-  const AttribMap* object = link ? link->path().pluginObject() : nullptr;
+  const AttribMap* object = link ? link->path().pluginObject(map) : nullptr;
   return !object || !(object->flags & attrNotStored);
 }
 
@@ -150,9 +150,11 @@ constexpr std::uint64_t smallestMember = 2 + 2 + 4 + 1;
 
 void AttribMap::write(Stream& stream, BinaryContext& context) const {
   Attribute::write(stream, context);
-  binary::put(stream, static_cast<std::uint32_t>(std::count_if(m_members.begin(), m_members.end(), stored)));
+  binary::put(stream,
+              static_cast<std::uint32_t>(std::count_if(
+                  m_members.begin(), m_members.end(), [this](const Member& member) { return stored(*this, member); })));
   for (const Member& member : m_members) {
-    if (!stored(member)) continue;
+    if (!stored(*this, member)) continue;
     context.writeName(stream, member.first);
     context.writeType(stream, member.second->type());
     binary::writeSized(stream, *member.second, context);
@@ -162,7 +164,7 @@ void AttribMap::write(Stream& stream, BinaryContext& context) const {
 void AttribMap::writeValue(StructuredWriter& writer) const {
   writer.beginObject();
   for (const Member& member : m_members) {
-    if (!stored(member)) continue;
+    if (!stored(*this, member)) continue;
     base::string key(text(member.first));
     key += '^';
     key += text(member.second->type());

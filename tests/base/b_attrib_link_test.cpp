@@ -59,8 +59,9 @@ TEST(AttribLink, PluginStepsGoThroughTheResolver) {
   base::AttribMap object;
   object.attribute<int>("color"_n) = 5;
   registeredObject = &object;
-  base::AttribPath::setPluginResolver(
-      [](std::uint32_t id) { return id == 12 ? registeredObject : static_cast<base::AttribMap*>(nullptr); });
+  base::AttribPath::setPluginResolver([](const base::AttribMap&, std::uint32_t id) {
+    return id == 12 ? registeredObject : static_cast<base::AttribMap*>(nullptr);
+  });
   base::AttribMap map;
   map.attribute("theirs"_n, link("@12/color"));
   map.attribute("gone"_n, link("@13/color", base::attrSilentLink));
