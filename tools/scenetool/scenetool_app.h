@@ -26,6 +26,8 @@ struct Command {
 
 /// Registers `scenetool ply FILE [--values] [--json]`.
 Command addPlyCommand(CLI::App& app);
+/// Registers `scenetool info FILE.scene [--json]`.
+Command addInfoCommand(CLI::App& app);
 
 /// Runs scenetool on the given arguments and returns the exit code.
 int run(int argc, const char* const* argv);
