@@ -1,11 +1,12 @@
 // Feeds arbitrary bytes to the attribute readers: the binary form of a map (plain names and
-// string ids, from memory and from a stream without a size) and the JSON form.
+// string ids), the JSON form, and object-list files.
 
 #include "b_attribute_map.h"
 #include "b_binary_io.h"
 #include "b_exception.h"
 #include "b_json.h"
 #include "b_log.h"
+#include "b_plugin_factory.h"
 
 #include <cstddef>
 #include <cstdint>
@@ -27,6 +28,12 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     } catch (const base::exception&) {
       // Refusing bad input is the point; crashing or hanging is the fault.
     }
+  }
+  try {
+    base::Stream stream = base::memStream(data, static_cast<std::int64_t>(size), "fuzz");
+    base::ref<base::PluginFactory> factory(new base::PluginFactory("fuzz"));
+    factory->read(stream);
+  } catch (const base::exception&) {
   }
   try {
     base::JsonReader reader(std::string_view(reinterpret_cast<const char*>(data), size));

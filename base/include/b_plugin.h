@@ -78,6 +78,10 @@ class BASE1_API IPlugin : public AttribMap, public RefCntAtomic {
   /// The first interface that answers `name`; null when none does.
   virtual IPluginInterface* queryInterface(name_id name) const;
 
+  /// Called by the factory just before the object is written to an object-list file, so
+  /// that it can bring its attributes up to date; does nothing here.
+  virtual void beforeWrite() {}
+
   /// Adds an interface; the object does not own it.
   void addInterface(IPluginInterface* interface);
 

@@ -123,6 +123,7 @@ void PluginFactory::write(Stream& stream) {
     progress.at(i);
     const auto type = std::lower_bound(types.begin(), types.end(), written[i]->mapType());
     binary::put(stream, static_cast<std::uint16_t>(type - types.begin()));
+    written[i]->beforeWrite();
     written[i]->write(stream, context);
   }
 }

@@ -1,12 +1,14 @@
 // Object-list files: a factory written and read back, references between objects, and the
 // failures that a damaged or foreign file must give.
 
+#include "b_attrib_link.h"
 #include "b_binary_io.h"
 #include "b_exception.h"
 #include "b_plugin_attribute.h"
 #include "b_plugin_factory.h"
 #include "log_capture.h"
 
+#include <fmt/format.h>
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -169,6 +171,60 @@ TEST(ObjectList, ABadTypeRecordStopsTheReadAndKeepsWhatWasRead) {
   EXPECT_NE(std::find(capture.texts().begin(), capture.texts().end(),
                       "plugin factory| Invalid plugin type record for id 1/2, aborting..."),
             capture.texts().end());
+}
+
+TEST(PluginReferences, ReplaceAndRemoveRewireTheOtherObjects) {
+  base::PluginFactory factory("scene");
+  const auto a = named(factory, "a"_n, "a");
+  const auto b = named(factory, "b"_n, "b");
+  const auto holder = named(factory, "h"_n, "h");
+  reference(*holder, "target"_n, a);
+  LogCapture capture;
+  EXPECT_TRUE(factory.replace(a->index(), b->index()));
+  EXPECT_EQ(referenced(*holder, "target"_n), b);
+  EXPECT_FALSE(factory.replace(9, 0));
+  EXPECT_FALSE(factory.replace(0, 9));
+  EXPECT_TRUE(factory.remove(b->index(), /*dropReferences=*/true));
+  EXPECT_FALSE(referenced(*holder, "target"_n));
+  EXPECT_EQ(capture.texts(),
+            (std::vector<std::string>{"plugin factory| Attempt to replace non existing plugin 9 detected!",
+                                      "plugin factory| Attempt to replace non existing plugin 0 detected!"}));
+}
+
+TEST(PluginReferences, PathsIntoObjectsResolveInTheHoldersFactory) {
+  base::PluginFactory factory("scene");
+  const auto material = named(factory, "material"_n, "steel");
+  material->attribute<float>("roughness"_n) = 0.25f;
+  const auto mesh = named(factory, "mesh"_n, "hull");
+  auto* link = new base::AttribLink;
+  ASSERT_TRUE(link->fromString(fmt::format("@{}/roughness", material->index())));
+  mesh->attribute("roughness"_n, link);
+  ASSERT_NE(mesh->findAttribute<float>("roughness"_n), nullptr);
+  EXPECT_EQ(*mesh->findAttribute<float>("roughness"_n), 0.25f);
+}
+
+// A descriptor that makes nothing.
+struct BarrenDesc : base::IPluginDesc {
+  BarrenDesc() { name = "barren"_n; }
+  base::IPlugin* create(base::PluginFactory*, std::uint32_t) override { return nullptr; }
+};
+
+TEST(PluginReferences, AnObjectThatCannotBeMadeKeepsItsIndexAndItsDataIsReadPast) {
+  base::PluginFactory written("writer");
+  named(written, "barren"_n, "lost");
+  named(written, "mesh"_n, "kept");
+  const auto bytes = bytesOf(written);
+  base::PluginFactory read("reader");
+  read.registerDesc(base::ref<base::IPluginDesc>(new BarrenDesc));
+  LogCapture capture(base::logError);
+  base::Stream stream = over(bytes, bytes.size());
+  read.read(stream);
+  ASSERT_EQ(read.objects().size(), 2u);
+  EXPECT_EQ(read.object(0), nullptr);
+  EXPECT_EQ(read.object(1)->toString(), "kept");
+  // Without a factory there is nothing to clone through.
+  base::IPlugin loose(nullptr, nullptr, base::IPlugin::unlisted);
+  EXPECT_EQ(loose.clone(), nullptr);
 }
 
 }  // namespace
