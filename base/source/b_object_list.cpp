@@ -101,6 +101,8 @@ void PluginFactory::write(Stream& stream) {
   NameCollector collector;
   Stream discard = Stream::adopt(new Discard);
   for (IPlugin* object : written) {
+    // Before the names are collected: the hook may add members.
+    object->beforeWrite();
     typeNames.insert(object->mapType());
     object->write(discard, collector);
   }
@@ -123,7 +125,6 @@ void PluginFactory::write(Stream& stream) {
     progress.at(i);
     const auto type = std::lower_bound(types.begin(), types.end(), written[i]->mapType());
     binary::put(stream, static_cast<std::uint16_t>(type - types.begin()));
-    written[i]->beforeWrite();
     written[i]->write(stream, context);
   }
 }
