@@ -38,8 +38,6 @@ class BASE1_API PluginFactory : public RefCntAtomic {
   bool unregisterDesc(name_id name);
   /// The descriptor registered under `name`, or null.
   ref<IPluginDesc> findDesc(name_id name) const;
-  /// The registered descriptors in handle order, dummy ones included.
-  base::vector<ref<IPluginDesc>> descriptors() const;
 
   /// A new object of `type` (see CreateFlag). An unknown type gives a general object under a
   /// dummy descriptor made once for it, or null with createOrNull; it is logged with
@@ -72,14 +70,11 @@ class BASE1_API PluginFactory : public RefCntAtomic {
   const base::vector<ref<IPlugin>>& objects() const { return m_objects; }
   const base::string& name() const { return m_name; }
   AttribFactory* attributeFactory() const { return m_attributes; }
-  /// The factory's own attributes.
-  AttribMap& attributes() { return m_ownAttributes; }
 
  private:
   IPluginDesc* descriptorFor(name_id type, std::uint32_t flags);
   IPluginDesc* dummyFor(name_id type);
 
-  AttribMap m_ownAttributes;
   base::map<name_id, ref<IPluginDesc>> m_descriptors;
   base::vector<ref<IPlugin>> m_objects;
   AttribFactory* m_attributes;

@@ -17,7 +17,7 @@ AttribMap* objectOfFactory(const AttribMap& from, std::uint32_t id) {
 }  // namespace
 
 PluginFactory::PluginFactory(std::string_view name, AttribFactory* attributes)
-    : m_ownAttributes(attributes), m_attributes(attributes), m_name(name) {
+    : m_attributes(attributes), m_name(name) {
   AttribPath::setPluginResolver(objectOfFactory);
 }
 
@@ -45,13 +45,6 @@ bool PluginFactory::unregisterDesc(name_id name) { return m_descriptors.erase(na
 ref<IPluginDesc> PluginFactory::findDesc(name_id name) const {
   const auto found = m_descriptors.find(name);
   return found == m_descriptors.end() ? ref<IPluginDesc>() : found->second;
-}
-
-base::vector<ref<IPluginDesc>> PluginFactory::descriptors() const {
-  base::vector<ref<IPluginDesc>> all;
-  all.reserve(m_descriptors.size());
-  for (const auto& entry : m_descriptors) all.push_back(entry.second);
-  return all;
 }
 
 IPluginDesc* PluginFactory::descriptorFor(name_id type, std::uint32_t flags) {

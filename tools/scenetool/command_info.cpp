@@ -51,12 +51,8 @@ void printSummary(const base::PluginFactory& factory) {
 
 int runInfo(const InfoOptions& options) {
   base::vector<std::uint8_t> data;
-  std::string error;
-  if (!readWholeFile(options.file, data, error)) {
-    printError(fmt::format("{}: cannot read the file: {}", options.file, error));
-    return exitFailed;
-  }
-  base::Stream stream = base::memStream(data.data(), static_cast<std::int64_t>(data.size()), options.file);
+  base::Stream stream;
+  if (!openInput(options.file, data, stream)) return exitFailed;
   base::ref<base::PluginFactory> factory(new base::PluginFactory("scene"));
   LogRelay relay;
   try {

@@ -32,12 +32,8 @@ bool dumpFile(base::Stream& stream, ply::Header& header, bool values) {
 
 int runPly(const PlyOptions& options) {
   base::vector<std::uint8_t> data;
-  std::string error;
-  if (!readWholeFile(options.file, data, error)) {
-    printError(fmt::format("{}: cannot read the file: {}", options.file, error));
-    return exitFailed;
-  }
-  base::Stream stream = base::memStream(data.data(), static_cast<std::int64_t>(data.size()), options.file);
+  base::Stream stream;
+  if (!openInput(options.file, data, stream)) return exitFailed;
   ply::Header header;
   LogRelay relay;
   const bool read = options.json ? dumpFile<PlyJsonDump>(stream, header, options.values)
@@ -52,8 +48,9 @@ int runPly(const PlyOptions& options) {
 
 Command addPlyCommand(CLI::App& app) {
   auto options = std::make_shared<PlyOptions>();
-  CLI::App* command = app.add_subcommand("ply", "Show a PLY file's header, and with --values its raw values, "
-                                                "without importing it");
+  CLI::App* command = app.add_subcommand("ply",
+                                         "Show a PLY file's header, and with --values its raw values, "
+                                         "without importing it");
   command->add_option("FILE", options->file, "The PLY file")->required();
   command->add_flag("--values", options->values, "Also show every property instance's value as read");
   command->add_flag("--json", options->json, "Write JSON instead of text");

@@ -1,5 +1,9 @@
 #include "file_input.h"
 
+#include "scenetool_app.h"
+
+#include <fmt/format.h>
+
 #include <cerrno>
 #include <cstdio>
 #include <cstring>
@@ -23,6 +27,16 @@ bool readWholeFile(const std::string& path, base::vector<std::uint8_t>& data, st
     error = std::strerror(errno);
     return false;
   }
+  return true;
+}
+
+bool openInput(const std::string& path, base::vector<std::uint8_t>& data, base::Stream& stream) {
+  std::string error;
+  if (!readWholeFile(path, data, error)) {
+    printError(fmt::format("{}: cannot read the file: {}", path, error));
+    return false;
+  }
+  stream = base::memStream(data.data(), static_cast<std::int64_t>(data.size()), path);
   return true;
 }
 

@@ -12,7 +12,7 @@ namespace scenetool {
 /// cause and goes into the one "scenetool: error:" line. Every other message, and a held
 /// error that turns out not to be the cause, is printed as a log line.
 class LogRelay : public base::LogSink {
-public:
+ public:
   LogRelay();
   ~LogRelay() override;
   LogRelay(const LogRelay&) = delete;
@@ -23,7 +23,7 @@ public:
   /// The held error, taken; empty when none was logged.
   std::optional<std::string> takeCause();
 
-private:
+ private:
   void printHeld();
 
   std::optional<std::string> m_held;

@@ -22,13 +22,18 @@ std::string valueText(const ply::Value& value, ply::DataType type) {
   switch (type) {
     case ply::DataType::int8:
     case ply::DataType::int16:
-    case ply::DataType::int32: return fmt::format("{}", value.i);
+    case ply::DataType::int32:
+      return fmt::format("{}", value.i);
     case ply::DataType::uint8:
     case ply::DataType::uint16:
-    case ply::DataType::uint32: return fmt::format("{}", value.u);
-    case ply::DataType::float32: return realText(value.f);
-    case ply::DataType::float64: return realText(value.d);
-    case ply::DataType::none: break;
+    case ply::DataType::uint32:
+      return fmt::format("{}", value.u);
+    case ply::DataType::float32:
+      return realText(value.f);
+    case ply::DataType::float64:
+      return realText(value.d);
+    case ply::DataType::none:
+      break;
   }
   return "null";
 }

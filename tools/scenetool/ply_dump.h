@@ -16,7 +16,7 @@ namespace scenetool {
 /// written while the file is read, so a large file is never held twice. Each instance is
 /// held until it is complete; one that the data cut short is left out.
 class PlyJsonDump {
-public:
+ public:
   /// `header` is the model that the parse fills; it is read when the body begins.
   PlyJsonDump(std::FILE* out, const ply::Header& header, bool values);
 
@@ -29,7 +29,7 @@ public:
   /// them when only the header was read).
   void finish();
 
-private:
+ private:
   void begin();
   void writeElementHead(const ply::Element& element);
   void writeValue(const ply::Value& value, ply::DataType type);
@@ -53,7 +53,7 @@ private:
 /// The same as readable text: format, elements with counts, properties with types, and with
 /// values one line per complete instance.
 class PlyTextDump {
-public:
+ public:
   PlyTextDump(std::FILE* out, const ply::Header& header, bool values)
       : m_out(out), m_header(header), m_values(values) {}
 
@@ -62,7 +62,7 @@ public:
   void plyProperty(const ply::Element& element, const ply::Property& property, const ply::ValueArray& values);
   void finish();
 
-private:
+ private:
   void begin();
   void writeElementHead(const ply::Element& element);
   void endLine();
