@@ -1,6 +1,6 @@
 #include "b_alloc.h"
 
-#include "b_platform.h"
+#include "b_platform_system.h"
 
 #include <cstdio>
 #include <cstdlib>

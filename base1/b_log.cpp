@@ -1,6 +1,6 @@
 #include "b_log.h"
 
-#include "b_platform.h"
+#include "b_platform_system.h"
 
 #include <algorithm>
 #include <cerrno>

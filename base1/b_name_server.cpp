@@ -12,7 +12,7 @@ namespace {
 // Texts live in large chunks that are never freed, so a handle stays valid for the life
 // of the process and interning a short text costs no allocation of its own.
 class NameArena {
-public:
+ public:
   const char* store(std::string_view text) {
     const std::size_t needed = text.size() + 1;
     if (needed > m_left) refill(needed);
@@ -24,7 +24,7 @@ public:
     return copy;
   }
 
-private:
+ private:
   static constexpr std::size_t chunkSize = 64 * 1024;
 
   void refill(std::size_t needed) {
@@ -38,7 +38,7 @@ private:
 };
 
 class InternTable final : public NameServer {
-public:
+ public:
   name_id intern(std::string_view text) override {
     if (name_id found = find(text)) return found;
     std::unique_lock lock(m_mutex);
@@ -60,7 +60,7 @@ public:
     return m_names.size();
   }
 
-private:
+ private:
   mutable std::shared_mutex m_mutex;
   // Node-based, so a record's address (the handle) never moves on rehash.
   std::unordered_map<std::string_view, NameRecord> m_names;

@@ -1,6 +1,6 @@
 #include "b_stack_walker.h"
 
-#include "b_platform.h"
+#include "b_platform_system.h"
 
 namespace base {
 namespace {

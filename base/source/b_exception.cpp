@@ -1,7 +1,7 @@
 #include "b_exception.h"
 
 #include "b_log.h"
-#include "b_platform.h"
+#include "b_platform_system.h"
 #include "b_stack_walker.h"
 
 #include <zlib.h>

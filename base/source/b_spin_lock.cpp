@@ -1,6 +1,6 @@
 #include "b_spin_lock.h"
 
-#include "b_platform.h"
+#include "b_platform_system.h"
 
 namespace base {
 
@@ -13,9 +13,14 @@ SpinLock::BackOff SpinLock::backOffStep(unsigned attempt) {
 
 void SpinLock::backOff(unsigned& attempt) {
   switch (backOffStep(attempt)) {
-    case BackOff::spin: break;
-    case BackOff::yield: platform::yieldThread(); break;
-    case BackOff::sleep0: platform::sleepMilliseconds(0); break;
+    case BackOff::spin:
+      break;
+    case BackOff::yield:
+      platform::yieldThread();
+      break;
+    case BackOff::sleep0:
+      platform::sleepMilliseconds(0);
+      break;
     case BackOff::sleep1:
       platform::sleepMilliseconds(1);
       attempt = 0;

@@ -50,9 +50,10 @@ void printSummary(const base::PluginFactory& factory) {
 }
 
 int runInfo(const InfoOptions& options) {
-  base::vector<std::uint8_t> data;
-  base::Stream stream;
-  if (!openInput(options.file, data, stream)) return exitFailed;
+  base::Stream file;
+  if (!openInput(options.file, file)) return exitFailed;
+  // The reader asks for a few bytes at a time.
+  base::Stream stream = base::bufReadStream(file, 0, 256 * 1024, options.file);
   base::ref<base::PluginFactory> factory(new base::PluginFactory("scene"));
   LogRelay relay;
   try {

@@ -31,9 +31,8 @@ bool dumpFile(base::Stream& stream, ply::Header& header, bool values) {
 }
 
 int runPly(const PlyOptions& options) {
-  base::vector<std::uint8_t> data;
   base::Stream stream;
-  if (!openInput(options.file, data, stream)) return exitFailed;
+  if (!openInput(options.file, stream)) return exitFailed;
   ply::Header header;
   LogRelay relay;
   const bool read = options.json ? dumpFile<PlyJsonDump>(stream, header, options.values)

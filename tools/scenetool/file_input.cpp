@@ -1,43 +1,36 @@
 #include "file_input.h"
 
+#include "b_exception.h"
+#include "b_fs.h"
 #include "scenetool_app.h"
 
 #include <fmt/format.h>
 
-#include <cerrno>
-#include <cstdio>
-#include <cstring>
-#include <memory>
-
 namespace scenetool {
+namespace {
 
-bool readWholeFile(const std::string& path, base::vector<std::uint8_t>& data, std::string& error) {
-  std::unique_ptr<std::FILE, int (*)(std::FILE*)> file(std::fopen(path.c_str(), "rb"), &std::fclose);
-  if (!file) {
-    error = std::strerror(errno);
-    return false;
-  }
-  data.clear();
-  std::uint8_t piece[1 << 16];
-  for (std::size_t got; (got = std::fread(piece, 1, sizeof piece, file.get())) > 0;) {
-    base::reserveForAppend(data, got);
-    data.insert(data.end(), piece, piece + got);
-  }
-  if (std::ferror(file.get())) {
-    error = std::strerror(errno);
-    return false;
-  }
-  return true;
+// The path the system was asked for, when aliases made it differ from what the user wrote.
+std::string expandedNote(const std::string& path, const base::fs::file_not_found& error) {
+  if (error.path().empty() || std::string_view(error.path()) == path) return {};
+  return fmt::format(" ({})", error.path());
 }
 
-bool openInput(const std::string& path, base::vector<std::uint8_t>& data, base::Stream& stream) {
-  std::string error;
-  if (!readWholeFile(path, data, error)) {
-    printError(fmt::format("{}: cannot read the file: {}", path, error));
-    return false;
+}  // namespace
+
+bool openInput(const std::string& path, base::Stream& stream) {
+  try {
+    stream = base::fs::master().open(path, base::fs::openForReading);
+    return true;
+  } catch (const base::fs::file_not_found& error) {
+    printError(fmt::format("{}: no such file{}", path, expandedNote(path, error)));
+  } catch (const base::invalid_argument& error) {
+    printError(fmt::format("{}: {}", path, error.argument()));
+  } catch (const base::api_exception& error) {
+    printError(fmt::format("{}: cannot open the file: {}", path, base::systemErrorText(error.errorCode())));
+  } catch (const base::exception& error) {
+    printError(fmt::format("{}: cannot open the file: {}", path, error.what()));
   }
-  stream = base::memStream(data.data(), static_cast<std::int64_t>(data.size()), path);
-  return true;
+  return false;
 }
 
 }  // namespace scenetool

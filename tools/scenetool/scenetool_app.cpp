@@ -1,6 +1,7 @@
 #include "scenetool_app.h"
 
 #include "b_exception.h"
+#include "b_fs.h"
 #include "b_log.h"
 #include "scenetool_version.h"
 
@@ -24,6 +25,22 @@ bool applyLogOptions(const Options& options) {
   return false;
 }
 
+// An alias entry is NAME=TEXT; a name of one letter would be read as a drive, never as an alias.
+std::string checkAlias(const std::string& entry) {
+  const std::size_t equals = entry.find('=');
+  if (equals == std::string::npos) return "an alias is NAME=TEXT";
+  if (equals < 2) return "an alias name has at least two characters";
+  if (entry.find(':') < equals) return "an alias name holds no ':'";
+  return {};
+}
+
+void applyAliases(const Options& options) {
+  for (const std::string& entry : options.aliases) {
+    const std::size_t equals = entry.find('=');
+    base::fs::aliases().set(std::string_view(entry).substr(0, equals), std::string_view(entry).substr(equals + 1));
+  }
+}
+
 void addGlobalOptions(CLI::App& app, Options& options) {
   app.require_subcommand(0, 1);
   app.add_flag("--version", options.version, "Print the version and exit");
@@ -31,6 +48,12 @@ void addGlobalOptions(CLI::App& app, Options& options) {
                  "Log messages up to this level: 2 errors, 3 warnings (default), 4 information, 5 debug")
       ->check(CLI::Range(0, 5));
   app.add_option("--log-file", options.logFile, "Also append log messages to this file");
+  app.add_option("--alias", options.aliases,
+                 "Let NAME: at the start of a path stand for TEXT (NAME=TEXT, repeatable), "
+                 "as in --alias models=/data/models/ then models:bunny.ply")
+      ->type_name("NAME=TEXT")
+      ->check(CLI::Validator(checkAlias, ""))
+      ->allow_extra_args(false);
 }
 
 // A failure that escapes a command is reported in the one error line, never as a crash.
@@ -67,6 +90,7 @@ int run(int argc, const char* const* argv) {
     return exitOk;
   }
   if (!applyLogOptions(options)) return exitFailed;
+  applyAliases(options);
   for (const Command& command : commands) {
     if (command.parser->parsed()) return runCommand(command);
   }

@@ -15,6 +15,7 @@ enum ExitCode : int { exitOk = 0, exitFailed = 1, exitUsage = 2 };
 struct Options {
   int logLevel = 3;
   std::string logFile;
+  std::vector<std::string> aliases;  ///< NAME=TEXT entries for the alias table
   bool version = false;
 };
 

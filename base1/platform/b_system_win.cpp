@@ -1,4 +1,7 @@
-#include "b_platform.h"
+#include "b_platform_system.h"
+
+#include "b_exception.h"
+#include "b_win_text.h"
 
 #include <windows.h>
 
@@ -12,9 +15,24 @@ base::string systemErrorText(std::uint32_t code) {
   const DWORD length = FormatMessageW(FORMAT_MESSAGE_FROM_SYSTEM | FORMAT_MESSAGE_IGNORE_INSERTS, nullptr, code,
                                       MAKELANGID(LANG_NEUTRAL, SUBLANG_DEFAULT), wide, 1024, nullptr);
   if (length == 0) return {};
-  const int bytes = WideCharToMultiByte(CP_UTF8, 0, wide, static_cast<int>(length), nullptr, 0, nullptr, nullptr);
+  return utf8Text(std::wstring_view(wide, length));
+}
+
+std::wstring wideText(std::string_view text) {
+  if (text.empty()) return {};
+  const int size = static_cast<int>(text.size());
+  const int count = MultiByteToWideChar(CP_UTF8, 0, text.data(), size, nullptr, 0);
+  std::wstring result(static_cast<std::size_t>(count), L'\0');
+  MultiByteToWideChar(CP_UTF8, 0, text.data(), size, result.data(), count);
+  return result;
+}
+
+base::string utf8Text(std::wstring_view text) {
+  if (text.empty()) return {};
+  const int size = static_cast<int>(text.size());
+  const int bytes = WideCharToMultiByte(CP_UTF8, 0, text.data(), size, nullptr, 0, nullptr, nullptr);
   base::string result(static_cast<std::size_t>(bytes), '\0');
-  WideCharToMultiByte(CP_UTF8, 0, wide, static_cast<int>(length), result.data(), bytes, nullptr, nullptr);
+  WideCharToMultiByte(CP_UTF8, 0, text.data(), size, result.data(), bytes, nullptr, nullptr);
   return result;
 }
 
@@ -44,6 +62,19 @@ std::tm localTime(std::time_t time) {
   std::tm local{};
   localtime_s(&local, &time);
   return local;
+}
+
+char pathSeparator() { return '\\'; }
+
+base::string executablePath() {
+  std::wstring path(1024, L'\0');
+  for (int attempt = 0; attempt < 10; ++attempt, path.resize(path.size() * 2)) {
+    const DWORD length = GetModuleFileNameW(nullptr, path.data(), static_cast<DWORD>(path.size()));
+    if (length == 0) raise<api_exception>("base::getExecutablePath", "Can't get the executable's path", GetLastError());
+    if (length < path.size()) return utf8Text(std::wstring_view(path.data(), length));
+  }
+  raise<api_exception>("base::getExecutablePath", "Can't get the executable's path",
+                       static_cast<std::uint32_t>(ERROR_INSUFFICIENT_BUFFER));
 }
 
 void yieldThread() { SwitchToThread(); }

@@ -1,9 +1,13 @@
-#include "b_platform.h"
+#include "b_platform_system.h"
+
+#include "b_exception.h"
 
 #include <execinfo.h>
 #include <sched.h>
 #include <sys/mman.h>
+#include <unistd.h>
 
+#include <cerrno>
 #include <cstdlib>
 #include <cstring>
 #include <memory>
@@ -48,6 +52,25 @@ std::tm localTime(std::time_t time) {
   std::tm local{};
   localtime_r(&time, &local);
   return local;
+}
+
+char pathSeparator() { return '/'; }
+
+base::string executablePath() {
+  base::string path(1024, '\0');
+  for (int attempt = 0; attempt < 10; ++attempt, path.resize(path.size() * 2)) {
+    const ssize_t length = readlink("/proc/self/exe", path.data(), path.size());
+    if (length < 0) {
+      raise<api_exception>("base::getExecutablePath", "Can't get the executable's path",
+                           static_cast<std::uint32_t>(errno));
+    }
+    if (static_cast<std::size_t>(length) < path.size()) {
+      path.resize(static_cast<std::size_t>(length));
+      return path;
+    }
+  }
+  raise<api_exception>("base::getExecutablePath", "Can't get the executable's path",
+                       static_cast<std::uint32_t>(ENAMETOOLONG));
 }
 
 void yieldThread() { sched_yield(); }

@@ -1,7 +1,8 @@
 #pragma once
 
-// The platform pieces of the core library. Each function has one definition in
-// b_platform_posix.cpp and one in b_platform_win.cpp; nothing else calls the system.
+// The system pieces of the core library: one definition per function in b_system_posix.cpp
+// and b_system_win.cpp. The other platform concerns have their own header in this folder;
+// nothing outside it calls the system.
 
 #include "b_containers.h"
 
@@ -24,6 +25,13 @@ void* allocateBytes(std::size_t size);
 
 /// The local calendar time of `time`; thread-safe.
 std::tm localTime(std::time_t time);
+
+/// The separator that the system's paths use.
+char pathSeparator();
+
+/// The running program's full path (UTF-8); throws base::api_exception when the system
+/// cannot tell it.
+base::string executablePath();
 
 /// Lets another thread run.
 void yieldThread();
