@@ -3,8 +3,9 @@
 #include "b_platform_fs.h"
 #include "b_win_text.h"
 
-#include <shellapi.h>
 #include <windows.h>
+// The shell's and the device-control declarations need windows.h first.
+#include <shellapi.h>
 #include <winioctl.h>
 
 #include <fmt/format.h>
