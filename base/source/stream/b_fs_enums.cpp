@@ -5,9 +5,8 @@
 
 namespace base::fs {
 
-template <class Next>
-void MultiFindFilesEnum<Next>::next() {
-  if (!m_current) raise<exception>("base::fs::MultiFindFilesEnum::next", "invalid call to MultiFindFilesEnum::next()");
+void ChainedEnum::next() {
+  if (!m_current) raise<exception>("base::fs::ChainedEnum::next", "invalid call to next() at the end of a listing");
   m_current->next();
   if (m_current->atEnd()) openNext();
 }
@@ -50,12 +49,6 @@ void RecursiveEnum::gatherFolders(const base::string& start) {
       base::append(m_folders, getDirectory(folders->directory() + folders->name() + "/"));
     }
   }
-}
-
-void RecursiveEnum::next() {
-  if (!m_current) raise<exception>("base::fs::RecursiveEnum::next", "invalid call to RecursiveEnum::next()");
-  m_current->next();
-  if (m_current->atEnd()) openNext();
 }
 
 void RecursiveEnum::openNext() {
