@@ -24,6 +24,7 @@ else()
   find_path(MESHPORT_RAPIDJSON_INCLUDE rapidjson/document.h REQUIRED)
   find_path(MESHPORT_MURMURHASH_INCLUDE murmurhash.h REQUIRED)
   find_library(MESHPORT_MURMURHASH_LIBRARY murmurhash REQUIRED)
+  find_package(pugixml REQUIRED)
 endif()
 # Header-only, used by scenetool alone; never part of the installed package.
 add_library(meshport_rapidjson INTERFACE)

@@ -110,6 +110,8 @@ class BASE1_API AttribMap : public Attribute {
 
   /// The map this one inherits absent members from; null for none (or once it died).
   void setBaseMap(AttribMap* base) { m_baseMap.set(base); }
+  /// Whether `map` is this map's base map or, further up, a base of its base.
+  bool inheritsFrom(const AttribMap* map) const;
   void setMapType(name_id mapType) { m_mapType = mapType; }
   const Members& members() const { return m_members; }
   AttribFactory* factory() const { return m_factory; }

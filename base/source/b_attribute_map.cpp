@@ -372,4 +372,8 @@ const void* AttribMap::find(name_id name, name_id type, Mismatch mismatch) const
   return m_baseMap.visit([&](const AttribMap* base) { return base ? base->find(name, type, mismatch) : nullptr; });
 }
 
+bool AttribMap::inheritsFrom(const AttribMap* map) const {
+  return m_baseMap.visit([map](const AttribMap* base) { return base && (base == map || base->inheritsFrom(map)); });
+}
+
 }  // namespace base
