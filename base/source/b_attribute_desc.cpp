@@ -108,8 +108,6 @@ ref<AttribMapDesc> readMap(const pugi::xml_node& node) {
   return desc;
 }
 
-#endif
-
 base::string readWholeFile(std::string_view path) {
   Stream file = fs::master().open(path, fs::openForReading);
   const std::int64_t size = file.getSize();
@@ -121,6 +119,8 @@ base::string readWholeFile(std::string_view path) {
   text.resize(file.read(text.data(), static_cast<std::uint32_t>(size)));
   return text;
 }
+
+#endif
 
 bool hasXmlExtension(std::string_view name) {
   const std::size_t dot = name.rfind('.');
