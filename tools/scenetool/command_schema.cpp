@@ -1,5 +1,4 @@
 #include "b_attribute_desc.h"
-#include "descriptions.h"
 #include "scene_schema_registry.h"
 #include "scenetool_app.h"
 
@@ -146,7 +145,6 @@ void printSchema(const scene::SchemaInfo& schema) {
 }
 
 int runSchema(const SchemaOptions& options) {
-  loadDescriptions();
   if (options.type.empty()) {
     options.json ? printTypesJson() : printTypes();
     return exitOk;

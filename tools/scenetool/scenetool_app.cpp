@@ -3,6 +3,7 @@
 #include "b_exception.h"
 #include "b_fs.h"
 #include "b_log.h"
+#include "descriptions.h"
 #include "scenetool_version.h"
 
 #include <fmt/format.h>
@@ -91,6 +92,7 @@ int run(int argc, const char* const* argv) {
   }
   if (!applyLogOptions(options)) return exitFailed;
   applyAliases(options);
+  loadDescriptions();
   for (const Command& command : commands) {
     if (command.parser->parsed()) return runCommand(command);
   }
