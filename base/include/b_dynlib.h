@@ -24,6 +24,8 @@ class BASE1_API DynLib : public RefCntAtomic {
   void* loadSymbol(const char* name) const;
 
   const base::string& fileName() const { return m_fileName; }
+  /// The end of a library's file name on this system: ".so", ".dll".
+  static const char* fileSuffix();
 
  private:
   void* m_handle;

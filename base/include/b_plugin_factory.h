@@ -38,6 +38,10 @@ class BASE1_API PluginFactory : public RefCntAtomic {
   bool unregisterDesc(name_id name);
   /// The descriptor registered under `name`, or null.
   ref<IPluginDesc> findDesc(name_id name) const;
+  /// Every registered descriptor by name.
+  const base::map<name_id, ref<IPluginDesc>>& descriptors() const { return m_descriptors; }
+  /// Unregisters every descriptor.
+  void clearDescriptors();
 
   /// A new object of `type` (see CreateFlag). An unknown type gives a general object under a
   /// dummy descriptor made once for it, or null with createOrNull; it is logged with
@@ -53,6 +57,10 @@ class BASE1_API PluginFactory : public RefCntAtomic {
   /// objects' references to it are replaced by none first. False, logged, for an index
   /// outside the list or an empty slot (nothing logged for 0xFFFFFFFF).
   bool remove(std::uint32_t index, bool dropReferences = false);
+
+  /// Drops the empty slots at the end of the object list, which removed objects left
+  /// behind; every listed object keeps its index. Returns the slots dropped.
+  std::size_t compact();
 
   /// Writes the object list as an object-list file (see docs/formats.md): the plug-in type,
   /// attribute type and name tables, then each listed object that is stored (not empty, no

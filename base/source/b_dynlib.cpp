@@ -22,6 +22,8 @@ DynLib::DynLib(std::string_view fileName) : m_handle(nullptr), m_fileName(fileNa
   }
 }
 
+const char* DynLib::fileSuffix() { return platform::libraryFileSuffix(); }
+
 DynLib::~DynLib() {
   if (m_handle) platform::closeLibrary(m_handle);
 }

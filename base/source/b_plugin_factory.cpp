@@ -108,6 +108,17 @@ bool PluginFactory::remove(std::uint32_t index, bool dropReferences) {
   return true;
 }
 
+std::size_t PluginFactory::compact() {
+  std::size_t dropped = 0;
+  while (!m_objects.empty() && !m_objects.back()) {
+    m_objects.pop_back();
+    ++dropped;
+  }
+  return dropped;
+}
+
+void PluginFactory::clearDescriptors() { m_descriptors.clear(); }
+
 IPlugin* PluginFactory::object(std::uint32_t index) const {
   return index < m_objects.size() ? m_objects[index].get() : nullptr;
 }

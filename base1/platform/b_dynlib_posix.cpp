@@ -10,7 +10,8 @@ void* openLibrary(const base::string& fileName, LibraryError& error) {
   errno = 0;
   void* library = dlopen(fileName.c_str(), RTLD_NOW | RTLD_LOCAL);
   if (library) return library;
-  error.code = static_cast<std::uint32_t>(errno);
+  // dlopen sets errno for a file it cannot open, not for one that is no library.
+  error.code = static_cast<std::uint32_t>(errno ? errno : ENOEXEC);
   const char* text = dlerror();
   error.text = text ? text : "";
   return nullptr;
@@ -29,5 +30,7 @@ void* findSymbol(void* library, const char* name, bool& missing, LibraryError& e
 }
 
 void closeLibrary(void* library) { dlclose(library); }
+
+const char* libraryFileSuffix() { return ".so"; }
 
 }  // namespace base::platform

@@ -25,4 +25,6 @@ void* findSymbol(void* library, const char* name, bool& missing, LibraryError& e
 
 void closeLibrary(void* library) { FreeLibrary(static_cast<HMODULE>(library)); }
 
+const char* libraryFileSuffix() { return ".dll"; }
+
 }  // namespace base::platform

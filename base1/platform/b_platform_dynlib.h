@@ -25,4 +25,7 @@ void* findSymbol(void* library, const char* name, bool& missing, LibraryError& e
 
 void closeLibrary(void* library);
 
+/// The end of a library's file name on this system.
+const char* libraryFileSuffix();
+
 }  // namespace base::platform

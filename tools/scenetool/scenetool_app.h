@@ -27,6 +27,8 @@ struct Command {
 
 /// Registers `scenetool ply FILE [--values] [--json]`.
 Command addPlyCommand(CLI::App& app);
+/// Registers `scenetool plugins [--json]`.
+Command addPluginsCommand(CLI::App& app);
 /// Registers `scenetool schema [TYPE] [--json]`.
 Command addSchemaCommand(CLI::App& app);
 /// Registers `scenetool info FILE.scene [--json]`.
