@@ -76,9 +76,11 @@ class BASE1_API AttribMap : public Attribute {
   /// Sets member `name` to `value`, replacing a member of another type (or a link).
   template <class T>
   requires(!std::is_convertible_v<T, Attribute*>) T& attribute(name_id name, const T& value) {
-    T& stored = *static_cast<T*>(replace(name, TypeTraits<T>::n_name).data());
-    stored = value;
-    return stored;
+    // Through setData, so that an attribute that keeps more than the value (a plug-in
+    // reference keeps its object's id) stays consistent.
+    Attribute& stored = replace(name, TypeTraits<T>::n_name);
+    stored.setData(&value);
+    return *static_cast<T*>(stored.data());
   }
   /// Stores `attr`, which the map owns from now on: inserted when absent; replacing a member
   /// of another type; a member of the same type keeps its object, takes `attr`'s value and
@@ -96,6 +98,8 @@ class BASE1_API AttribMap : public Attribute {
   const base::vector<T>* findVecAttribute(name_id name) const {
     return static_cast<const base::vector<T>*>(find(name, TypeTraits<T>::n_array_name, Mismatch::list));
   }
+  /// The member `name` as stored here (no links followed, no base map asked), or null.
+  const Attribute* findMember(name_id name) const { return member(name); }
   /// The slot that owns member `name`, or a shared slot holding null when absent. Neither
   /// links nor types are looked at. Throws on an empty name.
   Attribute** findAttributeMutable(name_id name);

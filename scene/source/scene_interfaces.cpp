@@ -33,7 +33,7 @@ bool IMaterial::inheritFrom(IMaterial* material) {
     return false;
   }
   setBaseMap(material);
-  attribute<base::ref<base::IPlugin>>(inherit()) = base::ref<base::IPlugin>(material);
+  attribute(inherit(), base::ref<base::IPlugin>(material));
   return true;
 }
 

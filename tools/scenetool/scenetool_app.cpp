@@ -75,8 +75,8 @@ int run(int argc, const char* const* argv) {
   CLI::App app(description, "scenetool");
   Options options;
   addGlobalOptions(app, options);
-  const std::vector<Command> commands{addPluginsCommand(app), addSchemaCommand(app), addPlyCommand(app),
-                                      addInfoCommand(app)};
+  const std::vector<Command> commands{addImportCommand(app), addPluginsCommand(app), addSchemaCommand(app),
+                                      addPlyCommand(app), addInfoCommand(app)};
   try {
     app.parse(argc, argv);
   } catch (const CLI::CallForHelp&) {

@@ -27,6 +27,8 @@ struct Command {
 
 /// Registers `scenetool ply FILE [--values] [--json]`.
 Command addPlyCommand(CLI::App& app);
+/// Registers `scenetool import FILE [-p NAME=VALUE]... [--json] [-o OUT.scene]`.
+Command addImportCommand(CLI::App& app);
 /// Registers `scenetool plugins [--json]`.
 Command addPluginsCommand(CLI::App& app);
 /// Registers `scenetool schema [TYPE] [--json]`.

@@ -1,0 +1,38 @@
+#pragma once
+
+#include "b_attribute_map.h"
+
+#include <cstdint>
+#include <span>
+
+namespace scene {
+
+/// Rewrites a mesh's index channels primitive by primitive into a canonical, sorted and
+/// delta-encoded form and marks the mesh `indicesDeltaCompression`. Each face is rotated to
+/// start at its smallest index (keeping its winding), the faces of a primitive are sorted,
+/// and the first channel holds differences; the other channels move in step. Every later
+/// user of face order (face-varying data, per-face attributes) must be encoded with it.
+/// False, with the mesh unchanged, for a mesh without indices, one already marked, or one
+/// whose channels are links or differ in length.
+///
+/// A primitive is left as it is without `vcounts` (strips), with a `vcounts` list holding a
+/// count below 3, or with a single count outside 2 to 4; a range beyond the channels is cut
+/// to them, and faces that the range does not hold whole are left out.
+bool encodeIndexDeltas(base::AttribMap& mesh);
+
+/// Encodes one primitive's range: `channels` point at the range's first index in each
+/// channel, `count` indices each. `faceCounts` (rewritten in the sorted order) gives each
+/// face's count, or is empty when every face has `uniformCount` indices.
+void encodeRangeDeltas(std::span<std::uint32_t* const> channels, std::uint32_t count,
+                       std::span<std::uint16_t> faceCounts, std::uint32_t uniformCount);
+
+/// Turns the differences of a marked mesh's first channel back into plain indices and
+/// clears the mark; the faces stay rotated and sorted. Touches exactly the primitives that
+/// encodeIndexDeltas encodes. False, unchanged, for a mesh that is not marked.
+bool decodeIndexDeltas(base::AttribMap& mesh);
+
+/// Reverses the difference pass of encodeRangeDeltas on one range of the first channel.
+void decodeRangeDeltas(std::uint32_t* channel, std::uint32_t count, std::span<const std::uint16_t> faceCounts,
+                       std::uint32_t uniformCount);
+
+}  // namespace scene

@@ -1,0 +1,37 @@
+#pragma once
+
+#include "b_attrib_array.h"
+#include "b_attribute_map.h"
+
+#include <cstdint>
+#include <optional>
+
+namespace scene {
+
+// Access to the nested records of a scene object: the mesh's `primitives`, `uvSets` and
+// `colorSets` are arrays of attribute maps.
+
+/// The array member `name` of `map`, created (replacing a member of another type) when it
+/// is not an array.
+base::AttribArray& arrayMember(base::AttribMap& map, base::name_id name);
+/// The array member `name` of `map`, or null.
+const base::AttribArray* findArrayMember(const base::AttribMap& map, base::name_id name);
+/// Appends an empty map to `array` and returns it.
+base::AttribMap& appendMap(base::AttribArray& array);
+/// Element `index` of `array` as a map; null when there is none or it is no map.
+base::AttribMap* mapAt(const base::AttribArray& array, std::uint32_t index);
+
+/// A primitive's face vertex counts: one count for every face, or a count per face.
+struct FaceCounts {
+  std::optional<std::uint16_t> uniform;
+  const base::vector<std::uint16_t>* perFace = nullptr;
+
+  bool present() const { return uniform || perFace; }
+};
+/// The `vcounts` of a primitive in either form (none when absent or of another type).
+FaceCounts faceCountsOf(const base::AttribMap& primitive);
+
+/// A uint32 member of a primitive (`indexStart`, `indexCount`, ...), when it is one.
+std::optional<std::uint32_t> uint32Member(const base::AttribMap& map, base::name_id name);
+
+}  // namespace scene

@@ -1,0 +1,273 @@
+#include "scene_index_delta.h"
+
+#include "b_log.h"
+#include "scene_mesh.h"
+#include "scene_schema.h"
+
+#include <algorithm>
+#include <array>
+
+namespace scene {
+namespace {
+
+constexpr std::uint32_t absent = 0xFFFFFFFFu;
+
+// Pass 1: the corner a face starts at, chosen on the first channel.
+std::uint32_t startCorner(const std::uint32_t* f, std::uint32_t n) {
+  if (n == 3) {
+    if (f[1] <= f[0] && f[1] <= f[2]) return 1;
+    if (f[2] <= f[0] && f[2] <= f[1]) return 2;
+    return 0;
+  }
+  if (n == 4) {
+    for (std::uint32_t s = 1; s < 4; ++s) {
+      bool smallest = true;
+      for (std::uint32_t j = 0; j < 4; ++j) smallest = smallest && (j == s || f[s] <= f[j]);
+      if (smallest) return s;
+    }
+    return 0;
+  }
+  return static_cast<std::uint32_t>(std::min_element(f, f + n) - f);
+}
+
+// Calls `each(offset, n)` for every face of a range, in order.
+template <class Each>
+void forEachFace(std::uint32_t count, std::span<const std::uint16_t> faceCounts, std::uint32_t uniformCount,
+                 Each&& each) {
+  if (faceCounts.empty()) {
+    for (std::uint32_t offset = 0; offset + uniformCount <= count; offset += uniformCount) each(offset, uniformCount);
+    return;
+  }
+  std::uint32_t offset = 0;
+  for (const std::uint16_t n : faceCounts) {
+    each(offset, n);
+    offset += n;
+  }
+}
+
+void rotateFaces(std::span<std::uint32_t* const> channels, std::uint32_t count,
+                 std::span<const std::uint16_t> faceCounts, std::uint32_t uniformCount) {
+  forEachFace(count, faceCounts, uniformCount, [&](std::uint32_t offset, std::uint32_t n) {
+    if (n == 2) {
+      if (channels[0][offset + 1] < channels[0][offset]) {
+        for (std::uint32_t* channel : channels) std::swap(channel[offset], channel[offset + 1]);
+      }
+      return;
+    }
+    const std::uint32_t start = startCorner(channels[0] + offset, n);
+    if (start == 0) return;
+    for (std::uint32_t* channel : channels)
+      std::rotate(channel + offset, channel + offset + start, channel + offset + n);
+  });
+}
+
+template <std::size_t N>
+void sortRecords(std::uint32_t* channel, std::uint32_t count) {
+  auto* records = reinterpret_cast<std::array<std::uint32_t, N>*>(channel);
+  std::sort(records, records + count / N);
+}
+
+struct FaceRecord {
+  std::uint32_t start;
+  std::uint16_t count;
+};
+
+std::array<std::uint32_t, 4> sortKey(const std::uint32_t* f, std::uint32_t n) {
+  return {f[0], n > 1 ? f[1] : absent, n > 2 ? f[2] : absent, n > 3 ? f[3] : absent};
+}
+
+// Pass 2 for several channels or mixed faces: face records sorted, then every channel (and
+// the counts) rewritten in the new order through one scratch buffer.
+void sortFaceRecords(std::span<std::uint32_t* const> channels, std::uint32_t count, std::span<std::uint16_t> faceCounts,
+                     std::uint32_t uniformCount) {
+  base::vector<FaceRecord> faces;
+  forEachFace(count, faceCounts, uniformCount, [&](std::uint32_t offset, std::uint32_t n) {
+    faces.push_back({offset, static_cast<std::uint16_t>(n)});
+  });
+  const std::uint32_t* first = channels[0];
+  std::sort(faces.begin(), faces.end(), [first](const FaceRecord& a, const FaceRecord& b) {
+    return sortKey(first + a.start, a.count) < sortKey(first + b.start, b.count);
+  });
+  base::vector<std::uint32_t> scratch(count);
+  for (std::uint32_t* channel : channels) {
+    std::copy(channel, channel + count, scratch.begin());
+    std::uint32_t at = 0;
+    for (const FaceRecord& face : faces) {
+      std::copy_n(scratch.begin() + face.start, face.count, channel + at);
+      at += face.count;
+    }
+  }
+  for (std::size_t k = 0; k < faceCounts.size(); ++k) faceCounts[k] = faces[k].count;
+}
+
+void sortFaces(std::span<std::uint32_t* const> channels, std::uint32_t count, std::span<std::uint16_t> faceCounts,
+               std::uint32_t uniformCount) {
+  if (faceCounts.empty() && channels.size() == 1 && uniformCount >= 2 && uniformCount <= 4) {
+    if (uniformCount == 2) sortRecords<2>(channels[0], count);
+    if (uniformCount == 3) sortRecords<3>(channels[0], count);
+    if (uniformCount == 4) sortRecords<4>(channels[0], count);
+    return;
+  }
+  sortFaceRecords(channels, count, faceCounts, uniformCount);
+}
+
+// The start of every face, for walking the faces backwards.
+base::vector<std::uint32_t> faceStarts(std::uint32_t count, std::span<const std::uint16_t> faceCounts,
+                                       std::uint32_t uniformCount) {
+  base::vector<std::uint32_t> starts;
+  forEachFace(count, faceCounts, uniformCount, [&](std::uint32_t offset, std::uint32_t) { starts.push_back(offset); });
+  return starts;
+}
+
+std::uint32_t faceSize(std::size_t k, std::span<const std::uint16_t> faceCounts, std::uint32_t uniformCount) {
+  return faceCounts.empty() ? uniformCount : faceCounts[k];
+}
+
+// Pass 3: each face against the previous one, from the last face to the first, so that the
+// previous face still holds plain values.
+void encodeDeltas(std::uint32_t* channel, std::uint32_t count, std::span<const std::uint16_t> faceCounts,
+                  std::uint32_t uniformCount) {
+  const base::vector<std::uint32_t> starts = faceStarts(count, faceCounts, uniformCount);
+  for (std::size_t k = starts.size(); k-- > 0;) {
+    std::uint32_t* f = channel + starts[k];
+    const std::uint32_t* p = k > 0 ? channel + starts[k - 1] : nullptr;
+    const std::uint32_t base = p && f[0] == p[0] ? p[1] : f[0];
+    f[1] -= base;
+    for (std::uint32_t j = 2; j < faceSize(k, faceCounts, uniformCount); ++j) f[j] -= f[0];
+    if (p) f[0] -= p[0];
+  }
+}
+
+// The channels of a mesh, first channel first; false (logged where the reason is the
+// channels themselves) when the mesh cannot be encoded.
+bool gatherChannels(base::AttribMap& mesh, base::vector<std::uint32_t*>& channels, std::uint32_t& length) {
+  base::vector<base::vector<std::uint32_t>*> lists;
+  bool linked = false;
+  const auto add = [&](base::AttribMap& map, base::name_id name) {
+    const base::Attribute* member = map.findMember(name);
+    if (!member) return;
+    if (const_cast<base::Attribute*>(member)->asLink()) linked = true;
+    if (member->type() == base::TypeTraits<std::uint32_t>::n_array_name) {
+      lists.push_back(static_cast<base::vector<std::uint32_t>*>(const_cast<base::Attribute*>(member)->data()));
+    }
+  };
+  add(mesh, mesh_schema::indices());
+  if (lists.empty() || lists[0]->empty() || linked) return false;
+  add(mesh, mesh_schema::positionIndices());
+  add(mesh, mesh_schema::normalIndices());
+  add(mesh, mesh_schema::tangentIndices());
+  for (const base::name_id sets : {mesh_schema::uvSets(), mesh_schema::colorSets()}) {
+    const base::AttribArray* array = findArrayMember(mesh, sets);
+    for (std::uint32_t i = 0; array && i < array->size(); ++i) {
+      if (base::AttribMap* set = mapAt(*array, i)) add(*set, meshUVSet_schema::indices());
+    }
+  }
+  length = static_cast<std::uint32_t>(lists[0]->size());
+  const bool inStep = std::all_of(lists.begin(), lists.end(), [&](const auto* list) { return list->size() == length; });
+  if (linked || !inStep) {
+    const base::string* name = mesh.findAttribute<base::string>(mesh_schema::name());
+    base::log().message(base::logScene, base::logDebug,
+                        "Failed to encode delta channel for mesh '{}'! Shared or verbose index channel detected.",
+                        name ? std::string_view(*name) : std::string_view());
+    return false;
+  }
+  for (base::vector<std::uint32_t>* list : lists) channels.push_back(list->data());
+  return true;
+}
+
+// Calls `range(start, count, faceCounts, uniformCount)` for every primitive range that the
+// encoding covers: whole faces of 2 to 4 indices each, or of 3 and more by a count list,
+// inside the channels.
+template <class Range>
+void forEachEncodableRange(const base::AttribMap& mesh, std::uint32_t length, Range&& range) {
+  const base::AttribArray* primitives = findArrayMember(mesh, mesh_schema::primitives());
+  for (std::uint32_t i = 0; primitives && i < primitives->size(); ++i) {
+    const base::AttribMap* primitive = mapAt(*primitives, i);
+    if (!primitive) continue;
+    const FaceCounts counts = faceCountsOf(*primitive);
+    if (counts.uniform && (*counts.uniform < 2 || *counts.uniform > 4)) continue;
+    if (counts.perFace && std::any_of(counts.perFace->begin(), counts.perFace->end(), [](auto n) { return n < 3; })) {
+      continue;
+    }
+    if (!counts.present()) continue;
+    const std::uint32_t start = uint32Member(*primitive, meshPrimitive_schema::indexStart()).value_or(0);
+    if (start >= length) continue;
+    std::uint32_t count =
+        std::min(uint32Member(*primitive, meshPrimitive_schema::indexCount()).value_or(length), length - start);
+    std::span<std::uint16_t> faceCounts;
+    if (counts.perFace) {
+      auto* list = const_cast<base::vector<std::uint16_t>*>(counts.perFace);
+      std::size_t faces = 0;
+      std::uint32_t covered = 0;
+      while (faces < list->size() && covered + (*list)[faces] <= count) covered += (*list)[faces++];
+      faceCounts = std::span<std::uint16_t>(list->data(), faces);
+      count = covered;
+    } else {
+      count -= count % *counts.uniform;
+    }
+    if (count > 0) range(start, count, faceCounts, counts.perFace ? 3u : std::uint32_t(*counts.uniform));
+  }
+}
+
+bool marked(const base::AttribMap& mesh) {
+  const base::Attribute* mark = mesh.findMember(mesh_schema::indicesDeltaCompression());
+  return mark && mark->type() == base::TypeTraits<bool>::n_name &&
+         *static_cast<const bool*>(const_cast<base::Attribute*>(mark)->data());
+}
+
+}  // namespace
+
+void encodeRangeDeltas(std::span<std::uint32_t* const> channels, std::uint32_t count,
+                       std::span<std::uint16_t> faceCounts, std::uint32_t uniformCount) {
+  if (channels.empty() || count == 0) return;
+  rotateFaces(channels, count, faceCounts, uniformCount);
+  sortFaces(channels, count, faceCounts, uniformCount);
+  encodeDeltas(channels[0], count, faceCounts, uniformCount);
+}
+
+void decodeRangeDeltas(std::uint32_t* channel, std::uint32_t count, std::span<const std::uint16_t> faceCounts,
+                       std::uint32_t uniformCount) {
+  const std::uint32_t* previous = nullptr;
+  forEachFace(count, faceCounts, uniformCount, [&](std::uint32_t offset, std::uint32_t n) {
+    std::uint32_t* f = channel + offset;
+    if (previous) f[0] += previous[0];
+    const std::uint32_t base = previous && f[0] == previous[0] ? previous[1] : f[0];
+    f[1] += base;
+    for (std::uint32_t j = 2; j < n; ++j) f[j] += f[0];
+    previous = f;
+  });
+}
+
+bool encodeIndexDeltas(base::AttribMap& mesh) {
+  if (marked(mesh)) return false;
+  base::vector<std::uint32_t*> channels;
+  std::uint32_t length = 0;
+  if (!gatherChannels(mesh, channels, length)) return false;
+  base::vector<std::uint32_t*> atStart(channels.size());
+  forEachEncodableRange(
+      mesh, length,
+      [&](std::uint32_t start, std::uint32_t count, std::span<std::uint16_t> faceCounts, std::uint32_t uniformCount) {
+        for (std::size_t c = 0; c < channels.size(); ++c) atStart[c] = channels[c] + start;
+        encodeRangeDeltas(atStart, count, faceCounts, uniformCount);
+      });
+  mesh.attribute<bool>(mesh_schema::indicesDeltaCompression(), true);
+  return true;
+}
+
+bool decodeIndexDeltas(base::AttribMap& mesh) {
+  if (!marked(mesh)) return false;
+  base::vector<std::uint32_t*> channels;
+  std::uint32_t length = 0;
+  // Channels that no longer run in step cannot be decoded: the mark stays, so nobody reads
+  // the differences as plain indices.
+  if (!gatherChannels(mesh, channels, length)) return false;
+  forEachEncodableRange(
+      mesh, length,
+      [&](std::uint32_t start, std::uint32_t count, std::span<std::uint16_t> faceCounts, std::uint32_t uniformCount) {
+        decodeRangeDeltas(channels[0] + start, count, faceCounts, uniformCount);
+      });
+  mesh.attribute<bool>(mesh_schema::indicesDeltaCompression(), false);
+  return true;
+}
+
+}  // namespace scene
