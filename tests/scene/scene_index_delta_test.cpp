@@ -1,6 +1,6 @@
+#include "scene_index_delta.h"
 #include "b_attrib_array.h"
 #include "log_capture.h"
-#include "scene_index_delta.h"
 #include "scene_mesh.h"
 #include "scene_schema.h"
 
@@ -56,7 +56,9 @@ std::unique_ptr<base::AttribMap> makeMesh(const Indices& indices, const std::vec
   return made;
 }
 
-const Indices& indicesOf(const base::AttribMap& mesh) { return *mesh.findVecAttribute<std::uint32_t>(mesh_schema::indices()); }
+const Indices& indicesOf(const base::AttribMap& mesh) {
+  return *mesh.findVecAttribute<std::uint32_t>(mesh_schema::indices());
+}
 
 TEST(IndexDeltas, WorkedExample) {
   EXPECT_EQ(encoded({4, 5, 6, 2, 0, 1}, 3), (Indices{0, 1, 2, 4, 1, 2}));
@@ -144,7 +146,8 @@ TEST(IndexDeltas, MeshesThatCannotBeEncodedAreLeftAlone) {
 
 // Each face as its rotation that starts at the smallest index: equal for equal faces with the
 // same winding.
-std::vector<std::vector<std::uint32_t>> canonicalFaces(const Indices& indices, const base::vector<std::uint16_t>& counts) {
+std::vector<std::vector<std::uint32_t>> canonicalFaces(const Indices& indices,
+                                                       const base::vector<std::uint16_t>& counts) {
   std::vector<std::vector<std::uint32_t>> faces;
   std::size_t at = 0;
   for (const std::uint16_t n : counts) {
@@ -175,8 +178,8 @@ TEST(IndexDeltas, RandomMeshesDecodeToTheirFacesUpToRotation) {
       for (std::uint16_t k = 0; k < n; ++k) indices.push_back(static_cast<std::uint32_t>(random() % 12));
     }
     const auto expected = canonicalFaces(indices, counts);
-    const auto made =
-        makeMesh(indices, {{0, static_cast<std::uint32_t>(indices.size()), mixed ? std::uint16_t(0) : uniform, counts}});
+    const auto made = makeMesh(
+        indices, {{0, static_cast<std::uint32_t>(indices.size()), mixed ? std::uint16_t(0) : uniform, counts}});
     base::AttribMap& mesh = *made;
     ASSERT_TRUE(scene::encodeIndexDeltas(mesh));
     ASSERT_TRUE(scene::decodeIndexDeltas(mesh));

@@ -1,0 +1,89 @@
+#pragma once
+
+// Imports files the way a host does: a scene factory that loads the PLY plug-in from disk,
+// and a scene factory with the scene types that receives the objects.
+
+#include "b_attrib_array.h"
+#include "b_fs.h"
+#include "b_json.h"
+#include "scene_factory.h"
+#include "scene_index_delta.h"
+#include "scene_mesh.h"
+#include "scene_schema.h"
+#include "scene_schema_registry.h"
+
+#include <filesystem>
+#include <fstream>
+#include <string>
+
+namespace testing_support {
+
+/// The scene factory with the plug-ins beside the programs (the build's bin folder).
+inline scene::SceneFactory& pluginFactory() {
+  static scene::SceneFactory factory;
+  static const bool loaded = [] {
+    factory.reloadPlugins(MESHPORT_PLUGIN_DIR, MESHPORT_DATA_DIR "/importers.txt");
+    return true;
+  }();
+  static_cast<void>(loaded);
+  return factory;
+}
+
+/// One import: the scene factory that received it.
+struct ImportedScene {
+  base::ref<base::PluginFactory> scene{new base::PluginFactory("scene")};
+  bool loaded = false;
+
+  ImportedScene() { scene::register_scene_schema(*scene); }
+
+  /// The first object of `type`, or null.
+  base::IPlugin* first(base::name_id type) const {
+    for (const auto& object : scene->objects()) {
+      if (object && object->mapType() == type) return object.get();
+    }
+    return nullptr;
+  }
+  base::IPlugin& mesh() const { return *first(scene::mesh_schema::typeName()); }
+  /// Primitive `index` of the mesh.
+  base::AttribMap& primitive(std::uint32_t index) const {
+    return *scene::mapAt(*scene::findArrayMember(mesh(), scene::mesh_schema::primitives()), index);
+  }
+  /// The objects as JSON, in factory order.
+  std::string json() const {
+    base::JsonWriter writer;
+    writer.beginArray();
+    for (const auto& object : scene->objects()) {
+      if (object) object->writeValue(writer);
+    }
+    writer.endArray();
+    return std::string(writer.text());
+  }
+};
+
+/// Imports `path`; with `plans` false the reader delivers every value one by one.
+inline ImportedScene importFile(const std::string& path, bool plans = true) {
+  ImportedScene imported;
+  base::AttribMap parameters;
+  if (!plans) parameters.attribute(base::intern("plyColumnPlans"), false);
+  imported.loaded = pluginFactory().load(*imported.scene, path, parameters);
+  return imported;
+}
+
+/// A file in a fresh temporary folder, removed with the object.
+class TemporaryFile {
+ public:
+  TemporaryFile(const std::string& name, const std::string& content) : m_folder(std::string(base::fs::tmpFilename())) {
+    std::filesystem::remove(m_folder);
+    std::filesystem::create_directory(m_folder);
+    std::ofstream(m_folder / name, std::ios::binary) << content;
+    m_path = (m_folder / name).string();
+  }
+  ~TemporaryFile() { std::filesystem::remove_all(m_folder); }
+  const std::string& path() const { return m_path; }
+
+ private:
+  std::filesystem::path m_folder;
+  std::string m_path;
+};
+
+}  // namespace testing_support
