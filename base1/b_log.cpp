@@ -18,6 +18,8 @@ const name_id logAll = intern("all");
 
 LogSink::~LogSink() = default;
 
+void LogSink::progress(name_id, std::string_view, std::uint64_t, std::uint64_t) {}
+
 Log::Log() = default;
 
 Log::~Log() {
@@ -69,6 +71,14 @@ void Log::write(name_id category, int level, std::string_view text) {
   const std::vector<LogSink*> sinks = m_sinks;
   for (LogSink* sink : sinks) sink->write(category, level, text);
 }
+
+void Log::progress(name_id category, std::string_view what, std::uint64_t done, std::uint64_t total) {
+  std::lock_guard lock(m_mutex);
+  const std::vector<LogSink*> sinks = m_sinks;
+  for (LogSink* sink : sinks) sink->progress(category, what, done, total);
+}
+
+bool isTerminal(std::FILE* stream) { return platform::isTerminal(stream); }
 
 void Log::setStderr(bool enabled) {
   std::lock_guard lock(m_mutex);

@@ -6,6 +6,7 @@
 #include <fmt/format.h>
 
 #include <atomic>
+#include <cstdint>
 #include <cstdio>
 #include <mutex>
 #include <string>
@@ -29,6 +30,8 @@ class BASE1_API LogSink {
  public:
   virtual ~LogSink();
   virtual void write(name_id category, int level, std::string_view text) = 0;
+  /// Long work has got to `done` of `total` (a front end draws a bar); nothing by default.
+  virtual void progress(name_id category, std::string_view what, std::uint64_t done, std::uint64_t total);
 };
 
 /// The log: a current level and the sinks that finished messages go to. Standard error is
@@ -64,6 +67,9 @@ class BASE1_API Log {
   int level() const { return m_level.load(std::memory_order_relaxed); }
   void setLevel(int level) { m_level = level; }
 
+  /// Hands a progress report to every sink (base::Progress makes them).
+  void progress(name_id category, std::string_view what, std::uint64_t done, std::uint64_t total);
+
   /// Turns the standard-error sink on or off.
   void setStderr(bool enabled);
   /// Appends every message to the file at `path` from now on; an empty path closes it.
@@ -88,6 +94,9 @@ BASE1_API Log& log();
 /// `text` as a message may quote it: words from a file are cut to `limit` bytes (never
 /// inside a UTF-8 sequence) and marked with "...", so a hostile word cannot flood the log.
 BASE1_API std::string clipped(std::string_view text, std::size_t limit = 80);
+
+/// Whether `stream` is an interactive terminal (where a progress bar may be drawn).
+BASE1_API bool isTerminal(std::FILE* stream);
 
 /// The text of a level: "error", "warning", "info", "debug" (others: "level N").
 BASE1_API std::string levelText(int level);

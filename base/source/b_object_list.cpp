@@ -5,6 +5,7 @@
 #include "b_log.h"
 #include "b_plugin_attribute.h"
 #include "b_plugin_factory.h"
+#include "b_progress.h"
 
 #include <fmt/format.h>
 
@@ -67,24 +68,6 @@ void writeTable(Stream& stream, const base::vector<name_id>& names) {
   for (name_id name : names) writeText(stream, text(name));
 }
 
-// Progress of a long read or write, at debug level, in steps of ten percent.
-class Progress {
- public:
-  Progress(const char* what, std::size_t total) : m_what(what), m_total(total) {}
-  void at(std::size_t done) {
-    const std::size_t percent = m_total ? (m_total / 2 + 100 * done) / m_total : 100;
-    if (percent / 10 == m_reported / 10 && done) return;
-    m_reported = percent;
-    log().message(logSystem, logDebug, "{}: {}%", m_what, percent);
-  }
-  ~Progress() { log().message(logSystem, logDebug, "{}: done", m_what); }
-
- private:
-  const char* m_what;
-  std::size_t m_total;
-  std::size_t m_reported = 0;
-};
-
 }  // namespace
 
 void PluginFactory::write(Stream& stream) {
@@ -120,7 +103,7 @@ void PluginFactory::write(Stream& stream) {
   writeTable(stream, context.names.names());
 
   binary::put(stream, static_cast<std::uint32_t>(written.size()));
-  Progress progress("Writing plugins", written.size());
+  Progress progress(logSystem, "Writing plugins", written.size());
   for (std::size_t i = 0; i < written.size(); ++i) {
     progress.at(i);
     const auto type = std::lower_bound(types.begin(), types.end(), written[i]->mapType());
@@ -191,7 +174,7 @@ void PluginFactory::read(Stream& stream) {
   const auto first = static_cast<std::uint32_t>(m_objects.size());
   // The least an object takes: its type index, its flags byte and its member count.
   const std::uint32_t count = binary::readCount(stream, 2 + 1 + 4, "objects");
-  Progress progress("Reading plugins", count);
+  Progress progress(logSystem, "Reading plugins", count);
   for (std::uint32_t i = 0; i < count; ++i) {
     progress.at(i);
     const auto type = binary::get<std::uint16_t>(stream);

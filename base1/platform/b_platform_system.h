@@ -8,6 +8,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <cstdio>
 #include <ctime>
 
 namespace base::platform {
@@ -32,6 +33,9 @@ char pathSeparator();
 /// The running program's full path (UTF-8); throws base::api_exception when the system
 /// cannot tell it.
 base::string executablePath();
+
+/// Whether `stream` is an interactive terminal.
+bool isTerminal(std::FILE* stream);
 
 /// Lets another thread run.
 void yieldThread();

@@ -73,6 +73,8 @@ base::string executablePath() {
                        static_cast<std::uint32_t>(ENAMETOOLONG));
 }
 
+bool isTerminal(std::FILE* stream) { return ::isatty(::fileno(stream)) == 1; }
+
 void yieldThread() { sched_yield(); }
 
 void sleepMilliseconds(unsigned milliseconds) { std::this_thread::sleep_for(std::chrono::milliseconds(milliseconds)); }

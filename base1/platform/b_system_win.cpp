@@ -5,6 +5,7 @@
 
 #include <windows.h>
 
+#include <io.h>
 #include <cstdio>
 #include <cstdlib>
 
@@ -76,6 +77,8 @@ base::string executablePath() {
   raise<api_exception>("base::getExecutablePath", "Can't get the executable's path",
                        static_cast<std::uint32_t>(ERROR_INSUFFICIENT_BUFFER));
 }
+
+bool isTerminal(std::FILE* stream) { return _isatty(_fileno(stream)) != 0; }
 
 void yieldThread() { SwitchToThread(); }
 

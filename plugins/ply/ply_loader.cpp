@@ -4,6 +4,7 @@
 #include "b_exception.h"
 #include "b_fs.h"
 #include "b_plugin_attribute.h"
+#include "b_progress.h"
 #include "b_timecode.h"
 #include "scene_index_delta.h"
 #include "scene_mesh.h"
@@ -106,7 +107,8 @@ bool PLYImporter::importScene(base::PluginFactory& factory, std::string_view pat
   m_normalsList = nullptr;
   m_indicesList = nullptr;
   m_vcountsList = nullptr;
-  base::Stream stream = base::fs::master().open(path, base::fs::openForReading);
+  const base::Stream file = base::fs::master().open(path, base::fs::openForReading);
+  base::Stream stream = base::progressStream(file, fmt::format("Importing {}", path));
   m_currentMesh = createRequired(factory, mesh_schema::typeName());
 
   Header header;

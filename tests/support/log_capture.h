@@ -39,7 +39,18 @@ class LogCapture : public base::LogSink {
     return result;
   }
 
+  void progress(base::name_id, std::string_view what, std::uint64_t done, std::uint64_t total) override {
+    progressReports.push_back({std::string(what), done, total});
+  }
+
+  struct ProgressReport {
+    std::string what;
+    std::uint64_t done;
+    std::uint64_t total;
+  };
+
   std::vector<Entry> entries;
+  std::vector<ProgressReport> progressReports;
 
  private:
   int m_previousLevel;

@@ -1,6 +1,7 @@
 #include "b_exception.h"
 #include "b_fs.h"
 #include "log_relay.h"
+#include "progress_bar.h"
 #include "scene_factory.h"
 #include "scene_json.h"
 #include "scene_schema_registry.h"
@@ -73,6 +74,9 @@ int runImport(const ImportOptions& options) {
   base::ref<base::PluginFactory> scene(new base::PluginFactory("scene"));
   scene::register_scene_schema(*scene);
   const auto start = std::chrono::steady_clock::now();
+  // A bar only for people watching: never beside JSON that a script reads.
+  std::optional<ProgressBar> bar;
+  if (!options.json) bar.emplace();
   try {
     if (const std::optional<int> failed = collectParameters(factory, options, parameters)) return *failed;
     if (!factory.load(*scene, options.file, parameters)) {
@@ -87,6 +91,7 @@ int runImport(const ImportOptions& options) {
     printError(fmt::format("{}: {}", options.file, cause ? *cause : error.what()));
     return exitFailed;
   }
+  bar.reset();
   const auto elapsed = std::chrono::duration<double, std::milli>(std::chrono::steady_clock::now() - start);
   if (options.json) {
     printSceneJson(*scene);
