@@ -162,8 +162,15 @@ void AttribMap::write(Stream& stream, BinaryContext& context) const {
 }
 
 void AttribMap::writeValue(StructuredWriter& writer) const {
+  // In name order: the members' own order follows handle addresses, which differ from one
+  // process to the next, and the same map should always read the same.
+  base::vector<const Member*> ordered;
+  for (const Member& member : m_members) ordered.push_back(&member);
+  std::sort(ordered.begin(), ordered.end(),
+            [](const Member* a, const Member* b) { return text(a->first) < text(b->first); });
   writer.beginObject();
-  for (const Member& member : m_members) {
+  for (const Member* entry : ordered) {
+    const Member& member = *entry;
     if (!stored(*this, member)) continue;
     base::string key(text(member.first));
     key += '^';
