@@ -30,7 +30,7 @@ struct ThrowSite {
 /// and the call stack at that moment (empty while capture is off on the thread), and writes
 /// itself to a log at level 2 in the "system" category.
 class BASE1_API exception : public std::exception {
-public:
+ public:
   exception(std::string_view message, const char* file, const char* function, unsigned line);
   ~exception() override;
 
@@ -44,11 +44,11 @@ public:
   const base::string& message() const { return m_message; }
   const base::string& callStack() const { return m_callStack; }
 
-protected:
+ protected:
   /// Writes "<message>(<detail>)" with the place, the form of kinds that carry a detail.
   void reportWithDetail(Log& log, std::string_view prefix, std::string_view detail) const;
 
-private:
+ private:
   unsigned m_line;
   const char* m_file;
   const char* m_function;
@@ -58,76 +58,84 @@ private:
 
 /// A switch met a value it has no case for.
 class BASE1_API switch_exception : public exception {
-public:
+ public:
+  ~switch_exception() override;
   switch_exception(const char* file, const char* function, unsigned line);
 };
 
 /// A text that does not convert to the requested type.
 class BASE1_API string_conversion_exception : public exception {
-public:
+ public:
+  ~string_conversion_exception() override;
   /// An empty `message` becomes "Invalid string conversion".
   string_conversion_exception(std::string_view message, const char* file, const char* function, unsigned line);
 };
 
 /// An operating-system call failed; the message ends with the system's text for the code.
 class BASE1_API api_exception : public exception {
-public:
+ public:
+  ~api_exception() override;
   api_exception(std::string_view message, const char* file, const char* function, unsigned line,
                 std::uint32_t errorCode);
   std::uint32_t errorCode() const { return m_errorCode; }
 
-private:
+ private:
   std::uint32_t m_errorCode;
 };
 
 /// An object or stream lacks the interface that an operation needs.
 class BASE1_API unsupported_interface : public exception {
-public:
+ public:
+  ~unsupported_interface() override;
   unsupported_interface(const char* file, const char* function, unsigned line, const char* interfaceName);
   const char* interfaceName() const { return m_interface; }
   void report(Log& log) const override;
 
-private:
+ private:
   const char* m_interface;
 };
 
 /// An argument outside what the operation accepts.
 class BASE1_API invalid_argument : public exception {
-public:
+ public:
+  ~invalid_argument() override;
   invalid_argument(const char* file, const char* function, unsigned line, std::string_view argument);
   const base::string& argument() const { return m_argument; }
   void report(Log& log) const override;
 
-private:
+ private:
   base::string m_argument;
 };
 
 /// A password that does not open the data.
 class BASE1_API wrong_password : public exception {
-public:
+ public:
+  ~wrong_password() override;
   using exception::exception;
 };
 
 /// A zlib call failed; reports with zlib's text for the result code.
 class BASE1_API zlib_exception : public exception {
-public:
+ public:
+  ~zlib_exception() override;
   zlib_exception(std::string_view message, const char* file, const char* function, unsigned line, int zlibCode);
   int zlibCode() const { return m_zlibCode; }
   void report(Log& log) const override;
 
-private:
+ private:
   int m_zlibCode;
 };
 
 namespace fs {
 /// A path that names no file.
 class BASE1_API file_not_found : public base::exception {
-public:
+ public:
+  ~file_not_found() override;
   file_not_found(std::string_view message, const char* file, const char* function, unsigned line,
                  std::string_view path);
   const base::string& path() const { return m_path; }
 
-private:
+ private:
   base::string m_path;
 };
 }  // namespace fs

@@ -94,4 +94,17 @@ file_not_found::file_not_found(std::string_view message, const char* file, const
     : exception(message, file, function, line), m_path(path) {}
 }  // namespace fs
 
+// Out of line, so that each kind's type information lives in this library alone and a
+// plug-in that throws one does not carry (and export) a copy of its own.
+switch_exception::~switch_exception() = default;
+string_conversion_exception::~string_conversion_exception() = default;
+api_exception::~api_exception() = default;
+unsupported_interface::~unsupported_interface() = default;
+invalid_argument::~invalid_argument() = default;
+wrong_password::~wrong_password() = default;
+zlib_exception::~zlib_exception() = default;
+namespace fs {
+file_not_found::~file_not_found() = default;
+}  // namespace fs
+
 }  // namespace base

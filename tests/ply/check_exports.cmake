@@ -1,0 +1,12 @@
+# Fails unless the plug-in LIBRARY exports exactly loadScenePlugin and unloadScenePlugin.
+execute_process(COMMAND nm -D --defined-only ${LIBRARY} OUTPUT_VARIABLE symbols RESULT_VARIABLE code)
+if(NOT code EQUAL 0)
+  message(FATAL_ERROR "nm failed on ${LIBRARY}")
+endif()
+string(REGEX MATCHALL "[0-9a-f]+ [A-Z] [^\n]+" exported "${symbols}")
+list(TRANSFORM exported REPLACE "^[0-9a-f]+ [A-Z] " "")
+list(SORT exported)
+if(NOT exported STREQUAL "loadScenePlugin;unloadScenePlugin")
+  message(FATAL_ERROR "exports: ${exported}")
+endif()
+message("exports: ${exported}")
