@@ -292,6 +292,14 @@ TEST(PlyImport, AFailingHeaderFailsTheImportAndLeavesNothing) {
                            [](const auto& object) { return object != nullptr; }));
 }
 
+TEST(PlyImport, ASceneThatCannotMakeTheNeededTypesFailsClearly) {
+  LogCapture log;
+  const TemporaryFile file("points.ply", asciiHeader + "element vertex 1\nproperty float x\nend_header\n1\n");
+  base::PluginFactory bare("bare");
+  EXPECT_EQ(stream_tests::thrownText([&] { testing_support::pluginFactory().load(bare, file.path(), base::AttribMap()); }),
+            "the scene has no type 'mesh', which a PLY import needs");
+}
+
 TEST(PlyImport, TheImporterObject) {
   scene::SceneFactory& factory = testing_support::pluginFactory();
   ASSERT_EQ(factory.scenePlugins().size(), 1u);
