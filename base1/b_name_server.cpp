@@ -69,6 +69,8 @@ class InternTable final : public NameServer {
 
 }  // namespace
 
+NameServer::~NameServer() = default;
+
 NameServer& nameServer() {
   // Never destroyed: handles must outlive every static object of every module.
   static InternTable* table = new InternTable;

@@ -19,7 +19,7 @@ using name_id = const NameRecord*;
 
 /// The process-wide table of interned texts. Thread-safe; entries are never removed.
 class BASE1_API NameServer {
-public:
+ public:
   /// Returns the handle of `text`, inserting it on first sight.
   virtual name_id intern(std::string_view text) = 0;
   /// Returns the handle of `text` when it is interned already, else null; inserts nothing.
@@ -27,8 +27,9 @@ public:
   /// Number of interned texts.
   virtual std::size_t size() const = 0;
 
-protected:
-  ~NameServer() = default;
+ protected:
+  // Out of line: the class's type information then lives in base1 alone.
+  virtual ~NameServer();
 };
 
 /// The process-wide name server; callers never own it.

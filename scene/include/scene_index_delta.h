@@ -31,6 +31,10 @@ void encodeRangeDeltas(std::span<std::uint32_t* const> channels, std::uint32_t c
 /// encodeIndexDeltas encodes. False, unchanged, for a mesh that is not marked.
 bool decodeIndexDeltas(base::AttribMap& mesh);
 
+/// The mesh's `indices` as plain indices: decoded when the mesh is marked, as stored
+/// otherwise (empty without indices). The mesh is not changed.
+base::vector<std::uint32_t> decodedIndices(const base::AttribMap& mesh);
+
 /// Reverses the difference pass of encodeRangeDeltas on one range of the first channel.
 void decodeRangeDeltas(std::uint32_t* channel, std::uint32_t count, std::span<const std::uint16_t> faceCounts,
                        std::uint32_t uniformCount);

@@ -270,4 +270,18 @@ bool decodeIndexDeltas(base::AttribMap& mesh) {
   return true;
 }
 
+base::vector<std::uint32_t> decodedIndices(const base::AttribMap& mesh) {
+  const base::Attribute* member = mesh.findMember(mesh_schema::indices());
+  if (!member || member->type() != base::TypeTraits<std::uint32_t>::n_array_name) return {};
+  base::vector<std::uint32_t> plain =
+      *static_cast<const base::vector<std::uint32_t>*>(const_cast<base::Attribute*>(member)->data());
+  if (!marked(mesh)) return plain;
+  forEachEncodableRange(
+      mesh, static_cast<std::uint32_t>(plain.size()),
+      [&](std::uint32_t start, std::uint32_t count, std::span<std::uint16_t> faceCounts, std::uint32_t uniformCount) {
+        decodeRangeDeltas(plain.data() + start, count, faceCounts, uniformCount);
+      });
+  return plain;
+}
+
 }  // namespace scene

@@ -6,6 +6,7 @@
 #include "log_capture.h"
 #include "ply_parser.h"
 #include "scene_import.h"
+#include "scene_validation.h"
 #include "thrown.h"
 
 #include <gtest/gtest.h>
@@ -178,5 +179,17 @@ INSTANTIATE_TEST_SUITE_P(Files, ImportedFile, ::testing::ValuesIn(plyFiles()),
                            }
                            return name;
                          });
+
+// Every valid test file imports into a mesh that validates without a single finding.
+TEST(ValidFiles, ImportAndValidateClean) {
+  for (const auto& entry : stdfs::directory_iterator(stdfs::path(MESHPORT_TEST_DATA) / "ply" / "valid")) {
+    if (entry.path().extension() != ".ply") continue;
+    const ImportedScene imported = importFile(entry.path().string());
+    ASSERT_TRUE(imported.loaded) << entry.path();
+    LogCapture findings(base::logWarning);
+    EXPECT_TRUE(scene::validateMesh(imported.mesh())) << entry.path();
+    for (const auto& finding : findings.entries) ADD_FAILURE() << entry.path().filename() << ": " << finding.text;
+  }
+}
 
 }  // namespace

@@ -296,8 +296,9 @@ TEST(PlyImport, ASceneThatCannotMakeTheNeededTypesFailsClearly) {
   LogCapture log;
   const TemporaryFile file("points.ply", asciiHeader + "element vertex 1\nproperty float x\nend_header\n1\n");
   base::PluginFactory bare("bare");
-  EXPECT_EQ(stream_tests::thrownText([&] { testing_support::pluginFactory().load(bare, file.path(), base::AttribMap()); }),
-            "the scene has no type 'mesh', which a PLY import needs");
+  EXPECT_EQ(
+      stream_tests::thrownText([&] { testing_support::pluginFactory().load(bare, file.path(), base::AttribMap()); }),
+      "the scene has no type 'mesh', which a PLY import needs");
 }
 
 TEST(PlyImport, TheImporterObject) {

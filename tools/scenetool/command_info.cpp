@@ -1,8 +1,5 @@
-#include "b_exception.h"
 #include "b_plugin_factory.h"
-#include "b_stream.h"
-#include "file_input.h"
-#include "log_relay.h"
+#include "scene_input.h"
 #include "scene_json.h"
 #include "scene_schema_registry.h"
 #include "scene_summary.h"
@@ -21,24 +18,9 @@ struct InfoOptions {
 };
 
 int runInfo(const InfoOptions& options) {
-  base::Stream file;
-  if (!openInput(options.file, file)) return exitFailed;
-  // The reader asks for a few bytes at a time.
-  base::Stream stream = base::bufReadStream(file, 0, 256 * 1024, options.file);
   base::ref<base::PluginFactory> factory(new base::PluginFactory("scene"));
   scene::register_scene_schema(*factory);
-  LogRelay relay;
-  try {
-    factory->read(stream);
-  } catch (const base::exception& failure) {
-    printError(fmt::format("{}: {}", options.file, failure.what()));
-    return exitFailed;
-  }
-  // A bad type record ends the read early with an error: the file is damaged.
-  if (const auto cause = relay.takeCause()) {
-    printError(fmt::format("{}: {}", options.file, *cause));
-    return exitFailed;
-  }
+  if (const int read = readObjectList(options.file, *factory); read != exitOk) return read;
   options.json ? printSceneJson(*factory) : printSceneSummary(*factory);
   return exitOk;
 }

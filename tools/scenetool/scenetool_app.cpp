@@ -76,7 +76,7 @@ int run(int argc, const char* const* argv) {
   Options options;
   addGlobalOptions(app, options);
   const std::vector<Command> commands{addImportCommand(app), addPluginsCommand(app), addSchemaCommand(app),
-                                      addPlyCommand(app), addInfoCommand(app)};
+                                      addPlyCommand(app),    addInfoCommand(app),    addValidateCommand(app)};
   try {
     app.parse(argc, argv);
   } catch (const CLI::CallForHelp&) {

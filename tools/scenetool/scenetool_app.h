@@ -33,6 +33,8 @@ Command addImportCommand(CLI::App& app);
 Command addPluginsCommand(CLI::App& app);
 /// Registers `scenetool schema [TYPE] [--json]`.
 Command addSchemaCommand(CLI::App& app);
+/// Registers `scenetool validate FILE`.
+Command addValidateCommand(CLI::App& app);
 /// Registers `scenetool info FILE.scene [--json]`.
 Command addInfoCommand(CLI::App& app);
 

@@ -1,0 +1,258 @@
+#include "scene_validation.h"
+
+#include "b_color.h"
+#include "b_log.h"
+#include "b_normal.h"
+#include "b_vec.h"
+#include "scene_index_delta.h"
+#include "scene_mesh.h"
+#include "scene_schema.h"
+
+#include <cmath>
+#include <optional>
+
+namespace scene {
+namespace {
+
+using base::logError;
+using base::logScene;
+using base::logWarning;
+
+template <class T>
+const base::vector<T>* listOf(const base::AttribMap& map, base::name_id name) {
+  const base::Attribute* member = map.findMember(name);
+  if (!member || member->type() != base::TypeTraits<T>::n_array_name) return nullptr;
+  return static_cast<const base::vector<T>*>(const_cast<base::Attribute*>(member)->data());
+}
+
+std::string_view nameOf(const base::AttribMap& mesh) {
+  const base::string* name = mesh.findAttribute<base::string>(mesh_schema::name());
+  return name ? std::string_view(*name) : std::string_view();
+}
+
+// The components of a 2-, 3- or 4-float vector.
+template <class V>
+auto componentsOf(const V& v) {
+  if constexpr (requires { v.w; }) {
+    return std::array<float, 4>{v.x, v.y, v.z, v.w};
+  } else if constexpr (requires { v.z; }) {
+    return std::array<float, 3>{v.x, v.y, v.z};
+  } else {
+    return std::array<float, 2>{v.x, v.y};
+  }
+}
+
+struct VectorCheck {
+  const char* label;
+  std::size_t expected;  // 0: any count
+  bool zeroLength = false;
+  bool unitLength = false;
+};
+
+// Logs every bad element; false only when the count differs from the expected one.
+template <class V>
+bool checkVectors(const base::vector<V>& vectors, std::string_view mesh, const VectorCheck& check) {
+  for (const V& vector : vectors) {
+    const auto c = componentsOf(vector);
+    bool nan = false, infinite = false, zero = true;
+    float squared = 0;
+    for (const float value : c) {
+      nan = nan || std::isnan(value);
+      infinite = infinite || std::isinf(value);
+      zero = zero && value == 0.0f;
+      squared += value * value;
+    }
+    if (nan) {
+      base::log().message(logScene, logError, "validate |{}| Nan detected in the {}!", mesh, check.label);
+    } else if (infinite) {
+      base::log().message(logScene, logError, "validate |{}| Inf detected in the {}!", mesh, check.label);
+    } else if (check.zeroLength && zero) {
+      base::log().message(logScene, logWarning, "validate |{}| Zero length detected in the {}!", mesh, check.label);
+    } else if (check.unitLength && std::fabs(squared - 1.0f) > 1e-5f) {
+      base::log().message(logScene, logWarning, "validate |{}| Unnormalized detected in the {}!", mesh, check.label);
+    }
+  }
+  if (check.expected == 0 || vectors.size() == check.expected) return true;
+  base::log().message(logScene, logError, "validate |{}| The {} and positions count doesn't match!", mesh, check.label);
+  return false;
+}
+
+template <class V>
+bool checkOptional(const base::AttribMap& map, base::name_id name, std::string_view mesh, const VectorCheck& check) {
+  const base::vector<V>* vectors = listOf<V>(map, name);
+  return !vectors || checkVectors(*vectors, mesh, check);
+}
+
+// The vertex data: positions, normals, tangents, velocities, colour and UV sets.
+bool checkVertexData(const base::AttribMap& mesh, std::string_view name, std::size_t vertices) {
+  bool valid = true;
+  using Vec2 = base::base_vec2<float>;
+  using Vec3 = base::base_vec3<float>;
+  using Vec4 = base::base_vec4<float>;
+  valid &= checkOptional<base::normal>(mesh, mesh_schema::normals(), name, {"normals", vertices, true, true});
+  valid &= checkOptional<Vec3>(mesh, mesh_schema::tangents(), name, {"tangents", vertices, true, true});
+  valid &= checkOptional<Vec3>(mesh, mesh_schema::velocities(), name, {"velocities", vertices});
+  const base::AttribArray* colours = findArrayMember(mesh, mesh_schema::colorSets());
+  for (std::uint32_t i = 0; colours && i < colours->size(); ++i) {
+    const base::AttribMap* set = mapAt(*colours, i);
+    if (!set) continue;
+    valid &= checkOptional<Vec3>(*set, meshColorSet_schema::RGB(), name, {"rgb colors", vertices});
+    valid &= checkOptional<Vec4>(*set, meshColorSet_schema::RGBA(), name, {"rgba colors", vertices});
+  }
+  const base::AttribArray* uvs = findArrayMember(mesh, mesh_schema::uvSets());
+  for (std::uint32_t i = 0; uvs && i < uvs->size(); ++i) {
+    const base::AttribMap* set = mapAt(*uvs, i);
+    if (!set) continue;
+    valid &= checkOptional<Vec2>(*set, meshUVSet_schema::UV(), name, {"uv coordinates", vertices});
+    valid &= checkOptional<Vec3>(*set, meshUVSet_schema::UVW(), name, {"uvw coordinates", vertices});
+    valid &= checkOptional<Vec4>(*set, meshUVSet_schema::UVWQ(), name, {"uvwq coordinates", vertices});
+  }
+  return valid;
+}
+
+// A primitive's range in one index list: missing parts reported when there are several
+// primitives, a range beyond the list reported. Gives the range, or none when it is unknown.
+std::optional<std::pair<std::uint32_t, std::uint32_t>> checkRange(const base::AttribMap& primitive,
+                                                                  base::name_id startName, base::name_id countName,
+                                                                  std::size_t listSize, std::size_t primitives,
+                                                                  std::string_view mesh, const char* missingStart,
+                                                                  const char* missingCount) {
+  const std::optional<std::uint32_t> start = uint32Member(primitive, startName);
+  const std::optional<std::uint32_t> count = uint32Member(primitive, countName);
+  if (!start && primitives >= 2) base::log().message(logScene, logError, "validate |{}| {}", mesh, missingStart);
+  if (!count && primitives >= 2) base::log().message(logScene, logError, "validate |{}| {}", mesh, missingCount);
+  if (!start || !count) return std::nullopt;
+  if (std::uint64_t(*start) + *count > listSize) {
+    base::log().message(logScene, logError, "validate |{}| Index offset/count out of bounds {}-{} out of {}!", mesh,
+                        *start, *count, listSize);
+    return std::nullopt;
+  }
+  return std::make_pair(*start, *count);
+}
+
+// The face vertex counts of a primitive against the indices of its range (the whole list
+// when it names none); strips by their counts.
+void checkFaceCounts(const base::AttribMap& primitive, std::optional<std::uint32_t> rangeCount,
+                     const base::vector<std::uint32_t>* indices, std::string_view mesh) {
+  const FaceCounts counts = faceCountsOf(primitive);
+  const auto* ecounts = listOf<std::uint32_t>(primitive, meshPrimitive_schema::ecounts());
+  if (!counts.present() && !ecounts) {
+    base::log().message(logScene, logWarning, "validate |{}| Found primitive from unknown type!!", mesh);
+    return;
+  }
+  if (!indices) return;
+  const std::uint64_t covered = rangeCount ? *rangeCount : indices->size();
+  if (counts.uniform) {
+    // A count of 0 divides nothing: it is as wrong as any count that does not divide.
+    if (*counts.uniform == 0 || covered % *counts.uniform != 0) {
+      base::log().message(logScene, logError, "validate |{}| Invalid face vertex count {}!", mesh, *counts.uniform);
+    }
+    return;
+  }
+  std::uint64_t sum = 0;
+  if (counts.perFace) {
+    for (const std::uint16_t n : *counts.perFace) sum += n;
+  } else {
+    for (const std::uint32_t n : *ecounts) sum += n;
+  }
+  if (sum != covered) {
+    base::log().message(logScene, logError, "validate |{}| Invalid face vertex counts. Expected {}, got {}!", mesh,
+                        covered, sum);
+  }
+}
+
+// A primitive's topology code; -1 when it has none.
+int topologyOf(const base::AttribMap& primitive) {
+  const base::Attribute* member = primitive.findMember(meshPrimitive_schema::topology());
+  if (!member || member->type() != base::TypeTraits<std::uint8_t>::n_name) return -1;
+  return *static_cast<const std::uint8_t*>(const_cast<base::Attribute*>(member)->data());
+}
+
+void checkIndexValues(const base::vector<std::uint32_t>& values, std::size_t limit, std::string_view mesh,
+                      const char* format) {
+  for (const std::uint32_t value : values) {
+    if (value >= limit) base::log().message(logScene, logError, fmt::runtime(format), mesh, value);
+  }
+}
+
+}  // namespace
+
+bool validateMesh(const base::AttribMap& mesh) {
+  const std::string_view name = nameOf(mesh);
+  const auto* positions = listOf<base::base_vec3<float>>(mesh, mesh_schema::positions());
+  if (!positions) {
+    base::log().message(logScene, logError, "validate |{}| The vertex positions are missing!", name);
+  } else {
+    checkVectors(*positions, name, {"positions", 0});
+  }
+  // Without positions the other per-vertex lists have nothing to agree with.
+  const std::size_t vertices = positions ? positions->size() : 0;
+  bool valid = checkVertexData(mesh, name, vertices);
+
+  // Range checks look at vertex indices, never at the differences of an encoded mesh.
+  const base::vector<std::uint32_t> plain = decodedIndices(mesh);
+  const base::vector<std::uint32_t>* indices = listOf<std::uint32_t>(mesh, mesh_schema::indices()) ? &plain : nullptr;
+  const auto* triIndices = listOf<std::uint32_t>(mesh, mesh_schema::triIndices());
+  const auto* positionIndices = listOf<std::uint32_t>(mesh, mesh_schema::positionIndices());
+
+  const base::AttribArray* primitives = findArrayMember(mesh, mesh_schema::primitives());
+  bool indexed = false, perAttribute = false;
+  if (!primitives) {
+    base::log().message(logScene, logWarning, "validate |{}| Mesh doesn't contain any primitives!", name);
+  }
+  const std::size_t count = primitives ? primitives->size() : 0;
+  for (std::uint32_t i = 0; i < count; ++i) {
+    const base::AttribMap* primitive = mapAt(*primitives, i);
+    if (!primitive) continue;
+    const int topology = topologyOf(*primitive);
+    std::optional<std::uint32_t> rangeCount;
+    if (topology < 0 || topology == 1 || topology == 2 || topology == 4 || topology == 6) {
+      indexed = true;
+      const auto range =
+          checkRange(*primitive, meshPrimitive_schema::indexStart(), meshPrimitive_schema::indexCount(),
+                     indices ? indices->size() : 0, count, name, "Missing start index!", "Missing index count!");
+      if (range && indices) rangeCount = range->second;
+      if (triIndices) {
+        checkRange(*primitive, meshPrimitive_schema::triIndexStart(), meshPrimitive_schema::triIndexCount(),
+                   triIndices->size(), count, name, "Missing triangle start index!", "Missing triangle index count!");
+      }
+      perAttribute = perAttribute || topology == 2;
+    }
+    checkFaceCounts(*primitive, rangeCount, indices, name);
+  }
+
+  if (indexed) {
+    if (!indices || indices->empty()) {
+      base::log().message(logScene, logWarning, "validate |{}| Missing indices!", name);
+    }
+    if (indices && triIndices && indices->size() != triIndices->size()) {
+      base::log().message(logScene, logWarning, "validate |{}| Triangulated indices mismatch!", name);
+    }
+    if (!perAttribute && positions && indices) {
+      checkIndexValues(*indices, vertices, name, "validate |{}| Found face index out of range at position {}!");
+    }
+  }
+  if (perAttribute) {
+    if (!positionIndices || positionIndices->empty()) {
+      base::log().message(logScene, logWarning, "validate |{}| Missing position indices!", name);
+    } else {
+      checkIndexValues(*positionIndices, vertices, name,
+                       "validate |{}| Found position index out of range at position {}!");
+    }
+    const auto* normals = listOf<base::normal>(mesh, mesh_schema::normals());
+    if (const auto* normalIndices = listOf<std::uint32_t>(mesh, mesh_schema::normalIndices());
+        normalIndices && normals) {
+      checkIndexValues(*normalIndices, normals->size(), name,
+                       "validate |{}| Found normal index out of range at position {}!");
+    }
+    const auto* tangents = listOf<base::base_vec3<float>>(mesh, mesh_schema::tangents());
+    if (const auto* tangentIndices = listOf<std::uint32_t>(mesh, mesh_schema::tangentIndices());
+        tangentIndices && tangents) {
+      checkIndexValues(*tangentIndices, tangents->size(), name,
+                       "validate |{}| Found tangent index out of range at position {}!");
+    }
+  }
+  return valid;
+}
+
+}  // namespace scene
