@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cerrno>
 #include <chrono>
+#include <cstring>
 #include <ctime>
 
 #include <fmt/chrono.h>
@@ -90,7 +91,8 @@ bool Log::setFile(const std::string& path, std::string& error) {
   if (!path.empty()) {
     file = std::fopen(path.c_str(), "a");
     if (!file) {
-      error = platform::systemErrorText(static_cast<std::uint32_t>(errno));
+      // fopen reports through the C library's errno, whose texts the C library has.
+      error = std::strerror(errno);
       return false;
     }
   }

@@ -2,6 +2,10 @@
 # packages of the header-only libraries, so it reads their Debian headers through a
 # directory that holds nothing else (the host's /usr/include must stay out of its path),
 # under the same target names that the packages' own CMake files give.
+# The Windows build links zlib into base1.dll, so that no zlib1.dll has to come along.
+if(CMAKE_CROSSCOMPILING)
+  set(ZLIB_USE_STATIC_LIBS ON)
+endif()
 find_package(ZLIB REQUIRED)
 
 if(CMAKE_CROSSCOMPILING)
@@ -18,6 +22,20 @@ if(CMAKE_CROSSCOMPILING)
   add_library(CLI11::CLI11 INTERFACE IMPORTED)
   target_include_directories(CLI11::CLI11 SYSTEM INTERFACE ${MESHPORT_HOST_HEADERS})
   set(MESHPORT_RAPIDJSON_INCLUDE ${MESHPORT_HOST_HEADERS})
+  # Libraries that Debian builds for Linux only come from their Debian source packages,
+  # fetched into the build tree and compiled here; nothing of them is in the repository.
+  set(MESHPORT_WINDOWS_DEPS ${CMAKE_BINARY_DIR}/deps)
+  execute_process(COMMAND ${PROJECT_SOURCE_DIR}/scripts/windows-deps ${MESHPORT_WINDOWS_DEPS})
+  if(EXISTS ${MESHPORT_WINDOWS_DEPS}/pugixml.unpacked)
+    add_library(meshport_pugixml STATIC ${MESHPORT_WINDOWS_DEPS}/pugixml/src/pugixml.cpp)
+    target_include_directories(meshport_pugixml SYSTEM PUBLIC ${MESHPORT_WINDOWS_DEPS}/pugixml/src)
+    add_library(pugixml::pugixml ALIAS meshport_pugixml)
+  endif()
+  if(MESHPORT_BUILD_TESTS AND EXISTS ${MESHPORT_WINDOWS_DEPS}/googletest.unpacked)
+    set(BUILD_GMOCK OFF CACHE BOOL "" FORCE)
+    set(INSTALL_GTEST OFF CACHE BOOL "" FORCE)
+    add_subdirectory(${MESHPORT_WINDOWS_DEPS}/googletest ${CMAKE_BINARY_DIR}/googletest EXCLUDE_FROM_ALL SYSTEM)
+  endif()
 else()
   find_package(fmt REQUIRED)
   find_package(CLI11 REQUIRED)
@@ -31,7 +49,9 @@ add_library(meshport_rapidjson INTERFACE)
 target_include_directories(meshport_rapidjson SYSTEM INTERFACE ${MESHPORT_RAPIDJSON_INCLUDE})
 
 if(MESHPORT_BUILD_TESTS)
-  find_package(GTest REQUIRED)
+  if(NOT TARGET GTest::gtest_main)
+    find_package(GTest REQUIRED)
+  endif()
   include(GoogleTest)
 endif()
 if(MESHPORT_BUILD_BENCH)

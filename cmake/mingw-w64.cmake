@@ -9,3 +9,15 @@ set(CMAKE_FIND_ROOT_PATH_MODE_PROGRAM NEVER)
 set(CMAKE_FIND_ROOT_PATH_MODE_LIBRARY ONLY)
 set(CMAKE_FIND_ROOT_PATH_MODE_INCLUDE ONLY)
 set(CMAKE_FIND_ROOT_PATH_MODE_PACKAGE ONLY)
+
+# The programs and libraries carry the compiler's runtime (and the static system libraries
+# such as zlib and winpthread), so that they run where nothing else is installed.
+set(CMAKE_EXE_LINKER_FLAGS_INIT "-static")
+set(CMAKE_SHARED_LINKER_FLAGS_INIT "-static")
+set(CMAKE_MODULE_LINKER_FLAGS_INIT "-static")
+
+# Test programs run under Wine where it is installed.
+find_program(MESHPORT_WINE wine)
+if(MESHPORT_WINE)
+  set(CMAKE_CROSSCOMPILING_EMULATOR ${MESHPORT_WINE})
+endif()

@@ -90,7 +90,9 @@ class BASE1_API IPlugin : public AttribMap, public RefCntAtomic {
   /// The position in the factory's list; 0xFFFFFFFF when not listed.
   std::uint32_t index() const { return m_index; }
 
-  static constexpr std::uint32_t unlisted = 0xFFFFFFFF;
+  // An enumerator, not a variable: it never needs a definition in the library (an imported
+  // constant would on Windows).
+  enum : std::uint32_t { unlisted = 0xFFFFFFFF };
 
  private:
   base::vector<IPluginInterface*> m_interfaces;

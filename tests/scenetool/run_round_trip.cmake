@@ -1,14 +1,14 @@
 # Imports FILE as JSON, imports it again into OUT as an object-list file, reads that back with
 # info --json, and fails unless both JSON texts are the same.
-execute_process(COMMAND ${PROGRAM} import --json ${FILE} RESULT_VARIABLE code OUTPUT_VARIABLE imported)
+execute_process(COMMAND ${EMULATOR} ${PROGRAM} import --json ${FILE} RESULT_VARIABLE code OUTPUT_VARIABLE imported)
 if(NOT code EQUAL 0)
   message(FATAL_ERROR "import --json exited with ${code}")
 endif()
-execute_process(COMMAND ${PROGRAM} import ${FILE} -o ${OUT} RESULT_VARIABLE code OUTPUT_QUIET)
+execute_process(COMMAND ${EMULATOR} ${PROGRAM} import ${FILE} -o ${OUT} RESULT_VARIABLE code OUTPUT_QUIET)
 if(NOT code EQUAL 0)
   message(FATAL_ERROR "import -o exited with ${code}")
 endif()
-execute_process(COMMAND ${PROGRAM} info --json ${OUT} RESULT_VARIABLE code OUTPUT_VARIABLE stored)
+execute_process(COMMAND ${EMULATOR} ${PROGRAM} info --json ${OUT} RESULT_VARIABLE code OUTPUT_VARIABLE stored)
 if(NOT code EQUAL 0)
   message(FATAL_ERROR "info --json exited with ${code}")
 endif()

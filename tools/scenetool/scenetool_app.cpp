@@ -44,6 +44,8 @@ void applyAliases(const Options& options) {
 
 void addGlobalOptions(CLI::App& app, Options& options) {
   app.require_subcommand(0, 1);
+  // Options are --words everywhere: a path that starts with '/' is a path, never an option.
+  app.allow_windows_style_options(false);
   app.add_flag("--version", options.version, "Print the version and exit");
   app.add_option("--log-level", options.logLevel,
                  "Log messages up to this level: 2 errors, 3 warnings (default), 4 information, 5 debug")

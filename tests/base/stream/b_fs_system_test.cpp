@@ -15,6 +15,16 @@ namespace {
 namespace stdfs = std::filesystem;
 using stream_tests::thrown;
 
+const std::string separator(1, static_cast<char>(stdfs::path::preferred_separator));
+
+// Symbolic links need a privilege on Windows (and Wine has none): tests of them are skipped
+// where one cannot be made.
+bool makeLink(const stdfs::path& target, const stdfs::path& link, bool folder) {
+  std::error_code error;
+  folder ? stdfs::create_directory_symlink(target, link, error) : stdfs::create_symlink(target, link, error);
+  return !error;
+}
+
 // A fresh folder for each test, holding the files a and b and the folder c with c/d.txt.
 class SystemFS : public ::testing::Test {
  protected:
@@ -54,7 +64,7 @@ TEST_F(SystemFS, FileListingsShowFilesOnlyAndFolderListingsFoldersOnly) {
   EXPECT_EQ(names(system->findFiles(path("c/*.txt"))), (std::vector<std::string>{"d.txt"}));
 
   const auto listing = system->findFiles(path("c/*.txt"));
-  EXPECT_EQ(std::string(listing->directory()), path("c") + "/");
+  EXPECT_EQ(std::string(listing->directory()), path("c") + separator);
   EXPECT_EQ(listing->size(), 5);
   EXPECT_EQ(listing->attributes() & base::fs::entryDirectory, 0u);
   EXPECT_GT(listing->modifiedTime(), 0);
@@ -74,7 +84,7 @@ TEST_F(SystemFS, RecursiveListingVisitsEveryFolderBelowTheStart) {
   write("c/e/f.txt", "");
   write("c/e/g.bin", "");
   // A link back up the tree must not make the listing endless.
-  stdfs::create_directory_symlink(root, root / "c" / "loop");
+  makeLink(root, root / "c" / "loop", true);
   EXPECT_EQ(names(system->findRecursive(path("*.txt"))), (std::vector<std::string>{"d.txt", "f.txt"}));
   EXPECT_EQ(names(base::fs::master().findRecursive(path("*"))),
             (std::vector<std::string>{"a", "b", "d.txt", "f.txt", "g.bin"}));
@@ -133,7 +143,9 @@ TEST_F(SystemFS, ReadersShareAFileWithAWriter) {
 }
 
 TEST_F(SystemFS, StreamPositionsSizesAndReopen) {
-  base::Stream stream = system->open(path("new.bin"), base::fs::openRead | base::fs::openWrite | base::fs::openCreate);
+  const std::uint32_t shared = base::fs::shareRead | base::fs::shareWrite;
+  base::Stream stream =
+      system->open(path("new.bin"), base::fs::openRead | base::fs::openWrite | base::fs::openCreate | shared);
   stream.write("0123456789", 10);
   EXPECT_EQ(stream.getSize(), 10);
   EXPECT_EQ(stream.setPosition(-3, base::seekEnd), 7);
@@ -144,7 +156,7 @@ TEST_F(SystemFS, StreamPositionsSizesAndReopen) {
   EXPECT_TRUE(stream.isEOF());
   stream.worker()->flush();
   // A reopened stream starts at the beginning of the same data, even of a truncating mode.
-  base::Stream writer = system->open(path("new.bin"), base::fs::openWrite | base::fs::openTruncate);
+  base::Stream writer = system->open(path("new.bin"), base::fs::openWrite | base::fs::openTruncate | shared);
   writer.write("abc", 3);
   base::Stream again = writer.clone();
   EXPECT_EQ(again.getSize(), 3);
@@ -180,10 +192,15 @@ TEST_F(SystemFS, AHasherSeesEveryBlockAndAMoveIsLogged) {
 TEST_F(SystemFS, SystemFailuresCarryTheNativeCodeAndText) {
   const auto error = thrown<base::api_exception>([&] { system->open(path("c"), base::fs::openForReading); });
   ASSERT_TRUE(error);
-  EXPECT_EQ(error->errorCode(), static_cast<std::uint32_t>(EISDIR));
+#ifdef _WIN32
+  const std::uint32_t code = 5;  // ERROR_ACCESS_DENIED: Windows opens no folder as a file
+#else
+  const std::uint32_t code = EISDIR;
+#endif
+  EXPECT_EQ(error->errorCode(), code);
   const std::string text = error->what();
   EXPECT_NE(text.find(path("c")), std::string::npos) << text;
-  EXPECT_NE(text.find(std::string("| ") + std::string(base::systemErrorText(EISDIR))), std::string::npos) << text;
+  EXPECT_NE(text.find(std::string("| ") + std::string(base::systemErrorText(code))), std::string::npos) << text;
 }
 
 TEST_F(SystemFS, ModifyingOperations) {
@@ -217,7 +234,7 @@ TEST_F(SystemFS, ModifyingOperations) {
 }
 
 TEST_F(SystemFS, LinksAndTheLinkSwitch) {
-  stdfs::create_symlink(root / "a", root / "link");
+  if (!makeLink(root / "a", root / "link", false)) GTEST_SKIP() << "this system makes no symbolic links";
   EXPECT_EQ(std::string(system->readLink(path("link"))), path("a"));
   EXPECT_EQ(system->readLink(path("a")), "");
   EXPECT_TRUE(system->symLinksPermitted());
@@ -230,7 +247,7 @@ TEST_F(SystemFS, LinksAndTheLinkSwitch) {
 
 TEST_F(SystemFS, PathFunctions) {
   const std::string temp(base::fs::tmpPath());
-  EXPECT_EQ(temp.back(), '/');
+  EXPECT_EQ(temp.back(), separator[0]);
   EXPECT_TRUE(stdfs::is_directory(temp));
   EXPECT_EQ(std::string(base::fs::currentPath()), stdfs::current_path().string());
   EXPECT_EQ(std::string(system->curdir()), stdfs::current_path().string());
