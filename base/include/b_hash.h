@@ -22,8 +22,8 @@ class BASE1_API Hash : public HostAllocated {
   virtual base::vector<std::uint8_t> digest() const = 0;
 };
 
-/// The first 64 bits of the MurmurHash3 (x86, 128-bit) digest of `size` bytes with seed 0.
-/// Where the build has no MurmurHash3 library (the Windows cross build, for now), 0.
+/// The first 64 bits of the MurmurHash3 (x86, 128-bit) digest of `size` bytes with seed 0:
+/// the MurmurHash3 library's, or where a build lacks it, the same algorithm's own code.
 BASE1_API std::uint64_t murmurHash3(const void* data, std::size_t size);
 
 }  // namespace base

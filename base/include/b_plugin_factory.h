@@ -2,6 +2,7 @@
 
 #include "b_attrib_factory.h"
 #include "b_attribute_map.h"
+#include "b_critical_section.h"
 #include "b_plugin.h"
 #include "b_refcnt.h"
 
@@ -86,7 +87,7 @@ class BASE1_API PluginFactory : public RefCntAtomic {
   base::map<name_id, ref<IPluginDesc>> m_descriptors;
   base::vector<ref<IPlugin>> m_objects;
   AttribFactory* m_attributes;
-  std::mutex m_lock;
+  CriticalSection m_lock;
   base::string m_name;
   base::vector<ref<IPluginDesc>> m_dummies;
 };

@@ -37,6 +37,13 @@ base::string executablePath();
 /// Whether `stream` is an interactive terminal.
 bool isTerminal(std::FILE* stream);
 
+/// A lock object made in `storage` (of `size` bytes): a critical section on Windows, a
+/// mutex elsewhere; entered, left and destroyed through the same storage.
+void createLock(void* storage, std::size_t size);
+void destroyLock(void* storage);
+void enterLock(void* storage);
+void leaveLock(void* storage);
+
 /// Lets another thread run.
 void yieldThread();
 

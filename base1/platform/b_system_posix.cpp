@@ -11,6 +11,8 @@
 #include <cstdlib>
 #include <cstring>
 #include <memory>
+#include <mutex>
+#include <new>
 #include <thread>
 
 namespace base::platform {
@@ -74,6 +76,18 @@ base::string executablePath() {
 }
 
 bool isTerminal(std::FILE* stream) { return ::isatty(::fileno(stream)) == 1; }
+
+void createLock(void* storage, std::size_t size) {
+  static_assert(alignof(std::mutex) <= 16);
+  if (size < sizeof(std::mutex)) std::abort();  // the storage was sized for every system
+  new (storage) std::mutex;
+}
+
+void destroyLock(void* storage) { static_cast<std::mutex*>(storage)->~mutex(); }
+
+void enterLock(void* storage) { static_cast<std::mutex*>(storage)->lock(); }
+
+void leaveLock(void* storage) { static_cast<std::mutex*>(storage)->unlock(); }
 
 void yieldThread() { sched_yield(); }
 

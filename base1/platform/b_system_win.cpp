@@ -80,6 +80,18 @@ base::string executablePath() {
 
 bool isTerminal(std::FILE* stream) { return _isatty(_fileno(stream)) != 0; }
 
+void createLock(void* storage, std::size_t size) {
+  static_assert(alignof(CRITICAL_SECTION) <= 16);
+  if (size < sizeof(CRITICAL_SECTION)) std::abort();  // the storage was sized for every system
+  InitializeCriticalSection(static_cast<CRITICAL_SECTION*>(storage));
+}
+
+void destroyLock(void* storage) { DeleteCriticalSection(static_cast<CRITICAL_SECTION*>(storage)); }
+
+void enterLock(void* storage) { EnterCriticalSection(static_cast<CRITICAL_SECTION*>(storage)); }
+
+void leaveLock(void* storage) { LeaveCriticalSection(static_cast<CRITICAL_SECTION*>(storage)); }
+
 void yieldThread() { SwitchToThread(); }
 
 void sleepMilliseconds(unsigned milliseconds) { Sleep(milliseconds); }

@@ -5,6 +5,7 @@
 #include "b_box.h"
 #include "b_color.h"
 #include "b_matrix.h"
+#include "b_murmurhash3.h"
 #include "b_normal.h"
 #include "b_quat.h"
 #include "b_timecode.h"
@@ -14,6 +15,12 @@
 #include "test_streams.h"
 
 #include <gtest/gtest.h>
+
+#include <algorithm>
+
+#include <vector>
+
+#include <random>
 #ifdef MESHPORT_HAVE_MURMURHASH
 #  include <murmurhash.h>
 #endif
@@ -160,27 +167,41 @@ TEST(AttributeBinary, TruncatedAndHostileInputsFailCleanly) {
 
 // The library is MurmurHash3 x86 128-bit: its published verification value (each prefix of
 // 0..255 hashed with seed 256 - length, then the digests hashed) must come out.
-#ifdef MESHPORT_HAVE_MURMURHASH
-TEST(AttributeHash, TheLibraryIsMurmurHash3X86_128) {
+// MurmurHash3 x86 128-bit: its published verification value (each prefix of 0..255 hashed
+// with seed 256 - length, then the digests hashed) must come out.
+TEST(AttributeHash, TheHashIsMurmurHash3X86_128) {
   std::uint8_t key[256];
   std::uint32_t digests[256][4];
   for (int length = 0; length < 256; ++length) {
     key[length] = static_cast<std::uint8_t>(length);
-    lmmh_x86_128(key, static_cast<unsigned>(length), static_cast<std::uint32_t>(256 - length), digests[length]);
+    base::detail::murmurHash3x86_128(key, static_cast<std::uint32_t>(length), static_cast<std::uint32_t>(256 - length),
+                                     digests[length]);
   }
   std::uint32_t verification[4];
-  lmmh_x86_128(digests, sizeof digests, 0, verification);
+  base::detail::murmurHash3x86_128(digests, sizeof digests, 0, verification);
   EXPECT_EQ(verification[0], 0xB3ECE62Au);
   // hash() is the digest's first 64 bits with seed 0.
   const char* text = "The quick brown fox jumps over the lazy dog";
   EXPECT_EQ(base::murmurHash3(text, std::strlen(text)), 0xecee2c672f1583c3u);
 }
+
+#ifdef MESHPORT_HAVE_MURMURHASH
+// The code for builds without the library agrees with the library on every length and seed.
+TEST(AttributeHash, OwnCodeAgreesWithTheLibrary) {
+  std::mt19937 random(3);
+  std::vector<std::uint8_t> bytes(300);
+  for (std::uint8_t& byte : bytes) byte = static_cast<std::uint8_t>(random());
+  for (std::uint32_t length = 0; length < bytes.size(); ++length) {
+    std::uint32_t library[4], own[4];
+    const std::uint32_t seed = random();
+    lmmh_x86_128(bytes.data(), length, seed, library);
+    base::detail::murmurHash3x86_128(bytes.data(), length, seed, own);
+    EXPECT_TRUE(std::equal(library, library + 4, own)) << "length " << length;
+  }
+}
 #endif
 
 TEST(AttributeHash, ListsHashTheBytesOfTheirBinaryForm) {
-#ifndef MESHPORT_HAVE_MURMURHASH
-  GTEST_SKIP() << "this build has no MurmurHash3";
-#endif
   base::TypedVectorAttribute<float> empty;
   EXPECT_EQ(empty.hash(), 0u);  // MurmurHash3 of no bytes with seed 0
   base::TypedVectorAttribute<float> a;
