@@ -31,26 +31,26 @@ Indices decoded(Indices indices, std::uint32_t uniform, std::span<const std::uin
 
 // A mesh with one index list and one primitive per entry of `primitives`: {start, count,
 // uniform count (0: use the list)} with the count list given.
-struct PrimitiveSpec {
+struct PrimitiveLayout {
   std::uint32_t start;
   std::uint32_t count;
   std::uint16_t uniform;
   base::vector<std::uint16_t> counts;
 };
 
-std::unique_ptr<base::AttribMap> makeMesh(const Indices& indices, const std::vector<PrimitiveSpec>& primitives) {
+std::unique_ptr<base::AttribMap> makeMesh(const Indices& indices, const std::vector<PrimitiveLayout>& primitives) {
   auto made = std::make_unique<base::AttribMap>();
   base::AttribMap& mesh = *made;
   mesh.attribute(mesh_schema::indices(), indices);
   base::AttribArray& array = scene::arrayMember(mesh, mesh_schema::primitives());
-  for (const PrimitiveSpec& spec : primitives) {
+  for (const PrimitiveLayout& layout : primitives) {
     base::AttribMap& primitive = scene::appendMap(array);
-    primitive.attribute(meshPrimitive_schema::indexStart(), spec.start);
-    primitive.attribute(meshPrimitive_schema::indexCount(), spec.count);
-    if (spec.uniform) {
-      primitive.attribute(meshPrimitive_schema::vcounts(), spec.uniform);
+    primitive.attribute(meshPrimitive_schema::indexStart(), layout.start);
+    primitive.attribute(meshPrimitive_schema::indexCount(), layout.count);
+    if (layout.uniform) {
+      primitive.attribute(meshPrimitive_schema::vcounts(), layout.uniform);
     } else {
-      primitive.attribute(meshPrimitive_schema::vcounts(), spec.counts);
+      primitive.attribute(meshPrimitive_schema::vcounts(), layout.counts);
     }
   }
   return made;
@@ -113,7 +113,7 @@ TEST(IndexDeltas, RangesStayInsideTheChannelAndHoldWholeFaces) {
   const Indices plain{2, 1, 0, 5, 4, 3, 9};
   const Indices bothFaces{0, 2, 1, 3, 5, 4, 9};
   const Indices firstFace{0, 2, 1, 5, 4, 3, 9};
-  const std::vector<std::pair<std::vector<PrimitiveSpec>, Indices>> cases{
+  const std::vector<std::pair<std::vector<PrimitiveLayout>, Indices>> cases{
       {{{0, 100, 3, {}}}, bothFaces},    // a count beyond the list
       {{{0, 5, 3, {}}}, firstFace},      // a range that ends inside a face
       {{{9, 3, 3, {}}}, plain},          // a start past the end
