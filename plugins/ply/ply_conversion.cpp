@@ -225,7 +225,7 @@ void PLYImporter::routeVertexProperties(const Element& element, std::uint32_t po
       case PropertySemantic::x:
       case PropertySemantic::y:
       case PropertySemantic::z:
-        value(positions, 4 * (static_cast<std::uint32_t>(property.semantic) - 0), Conversion::toFloat);
+        value(positions, 4 * static_cast<std::uint32_t>(property.semantic), Conversion::toFloat);
         break;
       case PropertySemantic::nx:
       case PropertySemantic::ny:
