@@ -2,6 +2,7 @@
 
 #include "b_attrib_array.h"
 #include "b_attribute_map.h"
+#include "b_type_traits.h"
 
 #include <cstdint>
 #include <optional>
@@ -31,7 +32,21 @@ struct FaceCounts {
 /// The `vcounts` of a primitive in either form (none when absent or of another type).
 FaceCounts faceCountsOf(const base::AttribMap& primitive);
 
-/// A uint32 member of a primitive (`indexStart`, `indexCount`, ...), when it is one.
-std::optional<std::uint32_t> uint32Member(const base::AttribMap& map, base::name_id name);
+/// Member `name` of `map` as stored there (no links followed, no base map asked) when it is
+/// a T; none when it is absent or of another type.
+template <class T>
+std::optional<T> scalarMember(const base::AttribMap& map, base::name_id name) {
+  const base::Attribute* member = map.findMember(name);
+  if (!member || member->type() != base::TypeTraits<T>::n_name) return std::nullopt;
+  return *static_cast<const T*>(const_cast<base::Attribute*>(member)->data());
+}
+
+/// The list member `name` of `map` as stored there when it is a list of T, else null.
+template <class T>
+const base::vector<T>* listMember(const base::AttribMap& map, base::name_id name) {
+  const base::Attribute* member = map.findMember(name);
+  if (!member || member->type() != base::TypeTraits<T>::n_array_name) return nullptr;
+  return static_cast<const base::vector<T>*>(const_cast<base::Attribute*>(member)->data());
+}
 
 }  // namespace scene

@@ -12,20 +12,6 @@ namespace {
 constexpr std::uint32_t restartMarker = 0xFFFFFFFFu;
 constexpr std::uint8_t lineStripTopology = 6;
 
-template <class T>
-std::optional<T> scalarMember(const base::AttribMap& map, base::name_id name) {
-  const base::Attribute* member = map.findMember(name);
-  if (!member || member->type() != base::TypeTraits<T>::n_name) return std::nullopt;
-  return *static_cast<const T*>(const_cast<base::Attribute*>(member)->data());
-}
-
-template <class T>
-const base::vector<T>* listMember(const base::AttribMap& map, base::name_id name) {
-  const base::Attribute* member = map.findMember(name);
-  if (!member || member->type() != base::TypeTraits<T>::n_array_name) return nullptr;
-  return static_cast<const base::vector<T>*>(const_cast<base::Attribute*>(member)->data());
-}
-
 std::string_view meshName(const base::AttribMap& mesh) {
   const base::string* name = mesh.findAttribute<base::string>(mesh_schema::name());
   return name ? std::string_view(*name) : std::string_view();
@@ -47,9 +33,10 @@ std::uint32_t countStrips(const base::AttribMap& primitive, std::optional<std::u
   }
   if (!source || (topology != 4 && topology != lineStripTopology)) return 0;
   const std::uint32_t size = static_cast<std::uint32_t>(source->size());
-  const std::uint32_t start = std::min(uint32Member(primitive, meshPrimitive_schema::indexStart()).value_or(0), size);
+  const std::uint32_t start =
+      std::min(scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexStart()).value_or(0), size);
   const std::uint32_t count =
-      std::min(uint32Member(primitive, meshPrimitive_schema::indexCount()).value_or(size), size - start);
+      std::min(scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexCount()).value_or(size), size - start);
   std::uint32_t run = 0;
   for (std::uint32_t i = start; i < start + count; ++i) {
     if ((*source)[i] == restartMarker) {

@@ -190,10 +190,10 @@ void forEachEncodableRange(const base::AttribMap& mesh, std::uint32_t length, Ra
       continue;
     }
     if (!counts.present()) continue;
-    const std::uint32_t start = uint32Member(*primitive, meshPrimitive_schema::indexStart()).value_or(0);
+    const std::uint32_t start = scalarMember<std::uint32_t>(*primitive, meshPrimitive_schema::indexStart()).value_or(0);
     if (start >= length) continue;
-    std::uint32_t count =
-        std::min(uint32Member(*primitive, meshPrimitive_schema::indexCount()).value_or(length), length - start);
+    std::uint32_t count = std::min(
+        scalarMember<std::uint32_t>(*primitive, meshPrimitive_schema::indexCount()).value_or(length), length - start);
     std::span<std::uint16_t> faceCounts;
     if (counts.perFace) {
       auto* list = const_cast<base::vector<std::uint16_t>*>(counts.perFace);
@@ -210,9 +210,7 @@ void forEachEncodableRange(const base::AttribMap& mesh, std::uint32_t length, Ra
 }
 
 bool marked(const base::AttribMap& mesh) {
-  const base::Attribute* mark = mesh.findMember(mesh_schema::indicesDeltaCompression());
-  return mark && mark->type() == base::TypeTraits<bool>::n_name &&
-         *static_cast<const bool*>(const_cast<base::Attribute*>(mark)->data());
+  return scalarMember<bool>(mesh, mesh_schema::indicesDeltaCompression()).value_or(false);
 }
 
 }  // namespace
@@ -271,10 +269,9 @@ bool decodeIndexDeltas(base::AttribMap& mesh) {
 }
 
 base::vector<std::uint32_t> decodedIndices(const base::AttribMap& mesh) {
-  const base::Attribute* member = mesh.findMember(mesh_schema::indices());
-  if (!member || member->type() != base::TypeTraits<std::uint32_t>::n_array_name) return {};
-  base::vector<std::uint32_t> plain =
-      *static_cast<const base::vector<std::uint32_t>*>(const_cast<base::Attribute*>(member)->data());
+  const base::vector<std::uint32_t>* stored = listMember<std::uint32_t>(mesh, mesh_schema::indices());
+  if (!stored) return {};
+  base::vector<std::uint32_t> plain = *stored;
   if (!marked(mesh)) return plain;
   forEachEncodableRange(
       mesh, static_cast<std::uint32_t>(plain.size()),

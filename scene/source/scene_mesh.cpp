@@ -1,6 +1,6 @@
 #include "scene_mesh.h"
 
-#include "b_type_traits.h"
+#include "scene_schema.h"
 
 namespace scene {
 
@@ -27,23 +27,10 @@ base::AttribMap* mapAt(const base::AttribArray& array, std::uint32_t index) {
 }
 
 FaceCounts faceCountsOf(const base::AttribMap& primitive) {
-  static const base::name_id vcounts = base::intern("vcounts");
   FaceCounts counts;
-  const base::Attribute* member = primitive.findMember(vcounts);
-  if (!member) return counts;
-  auto* value = const_cast<base::Attribute*>(member);
-  if (member->type() == base::TypeTraits<std::uint16_t>::n_name) {
-    counts.uniform = *static_cast<const std::uint16_t*>(value->data());
-  } else if (member->type() == base::TypeTraits<std::uint16_t>::n_array_name) {
-    counts.perFace = static_cast<const base::vector<std::uint16_t>*>(value->data());
-  }
+  counts.uniform = scalarMember<std::uint16_t>(primitive, meshPrimitive_schema::vcounts());
+  counts.perFace = listMember<std::uint16_t>(primitive, meshPrimitive_schema::vcounts());
   return counts;
-}
-
-std::optional<std::uint32_t> uint32Member(const base::AttribMap& map, base::name_id name) {
-  const base::Attribute* member = map.findMember(name);
-  if (!member || member->type() != base::TypeTraits<std::uint32_t>::n_name) return std::nullopt;
-  return *static_cast<const std::uint32_t*>(const_cast<base::Attribute*>(member)->data());
 }
 
 }  // namespace scene

@@ -18,13 +18,6 @@ using base::logError;
 using base::logScene;
 using base::logWarning;
 
-template <class T>
-const base::vector<T>* listOf(const base::AttribMap& map, base::name_id name) {
-  const base::Attribute* member = map.findMember(name);
-  if (!member || member->type() != base::TypeTraits<T>::n_array_name) return nullptr;
-  return static_cast<const base::vector<T>*>(const_cast<base::Attribute*>(member)->data());
-}
-
 std::string_view nameOf(const base::AttribMap& mesh) {
   const base::string* name = mesh.findAttribute<base::string>(mesh_schema::name());
   return name ? std::string_view(*name) : std::string_view();
@@ -79,7 +72,7 @@ bool checkVectors(const base::vector<V>& vectors, std::string_view mesh, const V
 
 template <class V>
 bool checkOptional(const base::AttribMap& map, base::name_id name, std::string_view mesh, const VectorCheck& check) {
-  const base::vector<V>* vectors = listOf<V>(map, name);
+  const base::vector<V>* vectors = listMember<V>(map, name);
   return !vectors || checkVectors(*vectors, mesh, check);
 }
 
@@ -117,8 +110,8 @@ std::optional<std::pair<std::uint32_t, std::uint32_t>> checkRange(const base::At
                                                                   std::size_t listSize, std::size_t primitives,
                                                                   std::string_view mesh, const char* missingStart,
                                                                   const char* missingCount) {
-  const std::optional<std::uint32_t> start = uint32Member(primitive, startName);
-  const std::optional<std::uint32_t> count = uint32Member(primitive, countName);
+  const std::optional<std::uint32_t> start = scalarMember<std::uint32_t>(primitive, startName);
+  const std::optional<std::uint32_t> count = scalarMember<std::uint32_t>(primitive, countName);
   if (!start && primitives >= 2) base::log().message(logScene, logError, "validate |{}| {}", mesh, missingStart);
   if (!count && primitives >= 2) base::log().message(logScene, logError, "validate |{}| {}", mesh, missingCount);
   if (!start || !count) return std::nullopt;
@@ -135,7 +128,7 @@ std::optional<std::pair<std::uint32_t, std::uint32_t>> checkRange(const base::At
 void checkFaceCounts(const base::AttribMap& primitive, std::optional<std::uint32_t> rangeCount,
                      const base::vector<std::uint32_t>* indices, std::string_view mesh) {
   const FaceCounts counts = faceCountsOf(primitive);
-  const auto* ecounts = listOf<std::uint32_t>(primitive, meshPrimitive_schema::ecounts());
+  const auto* ecounts = listMember<std::uint32_t>(primitive, meshPrimitive_schema::ecounts());
   if (!counts.present() && !ecounts) {
     base::log().message(logScene, logWarning, "validate |{}| Found primitive from unknown type!!", mesh);
     return;
@@ -161,13 +154,6 @@ void checkFaceCounts(const base::AttribMap& primitive, std::optional<std::uint32
   }
 }
 
-// A primitive's topology code; -1 when it has none.
-int topologyOf(const base::AttribMap& primitive) {
-  const base::Attribute* member = primitive.findMember(meshPrimitive_schema::topology());
-  if (!member || member->type() != base::TypeTraits<std::uint8_t>::n_name) return -1;
-  return *static_cast<const std::uint8_t*>(const_cast<base::Attribute*>(member)->data());
-}
-
 void checkIndexValues(const base::vector<std::uint32_t>& values, std::size_t limit, std::string_view mesh,
                       const char* format) {
   for (const std::uint32_t value : values) {
@@ -179,7 +165,7 @@ void checkIndexValues(const base::vector<std::uint32_t>& values, std::size_t lim
 
 bool validateMesh(const base::AttribMap& mesh) {
   const std::string_view name = nameOf(mesh);
-  const auto* positions = listOf<base::base_vec3<float>>(mesh, mesh_schema::positions());
+  const auto* positions = listMember<base::base_vec3<float>>(mesh, mesh_schema::positions());
   if (!positions) {
     base::log().message(logScene, logError, "validate |{}| The vertex positions are missing!", name);
   } else {
@@ -191,9 +177,10 @@ bool validateMesh(const base::AttribMap& mesh) {
 
   // Range checks look at vertex indices, never at the differences of an encoded mesh.
   const base::vector<std::uint32_t> plain = decodedIndices(mesh);
-  const base::vector<std::uint32_t>* indices = listOf<std::uint32_t>(mesh, mesh_schema::indices()) ? &plain : nullptr;
-  const auto* triIndices = listOf<std::uint32_t>(mesh, mesh_schema::triIndices());
-  const auto* positionIndices = listOf<std::uint32_t>(mesh, mesh_schema::positionIndices());
+  const base::vector<std::uint32_t>* indices =
+      listMember<std::uint32_t>(mesh, mesh_schema::indices()) ? &plain : nullptr;
+  const auto* triIndices = listMember<std::uint32_t>(mesh, mesh_schema::triIndices());
+  const auto* positionIndices = listMember<std::uint32_t>(mesh, mesh_schema::positionIndices());
 
   const base::AttribArray* primitives = findArrayMember(mesh, mesh_schema::primitives());
   bool indexed = false, perAttribute = false;
@@ -204,7 +191,8 @@ bool validateMesh(const base::AttribMap& mesh) {
   for (std::uint32_t i = 0; i < count; ++i) {
     const base::AttribMap* primitive = mapAt(*primitives, i);
     if (!primitive) continue;
-    const int topology = topologyOf(*primitive);
+    const auto code = scalarMember<std::uint8_t>(*primitive, meshPrimitive_schema::topology());
+    const int topology = code ? *code : -1;
     std::optional<std::uint32_t> rangeCount;
     if (topology < 0 || topology == 1 || topology == 2 || topology == 4 || topology == 6) {
       indexed = true;
@@ -239,14 +227,14 @@ bool validateMesh(const base::AttribMap& mesh) {
       checkIndexValues(*positionIndices, vertices, name,
                        "validate |{}| Found position index out of range at position {}!");
     }
-    const auto* normals = listOf<base::normal>(mesh, mesh_schema::normals());
-    if (const auto* normalIndices = listOf<std::uint32_t>(mesh, mesh_schema::normalIndices());
+    const auto* normals = listMember<base::normal>(mesh, mesh_schema::normals());
+    if (const auto* normalIndices = listMember<std::uint32_t>(mesh, mesh_schema::normalIndices());
         normalIndices && normals) {
       checkIndexValues(*normalIndices, normals->size(), name,
                        "validate |{}| Found normal index out of range at position {}!");
     }
-    const auto* tangents = listOf<base::base_vec3<float>>(mesh, mesh_schema::tangents());
-    if (const auto* tangentIndices = listOf<std::uint32_t>(mesh, mesh_schema::tangentIndices());
+    const auto* tangents = listMember<base::base_vec3<float>>(mesh, mesh_schema::tangents());
+    if (const auto* tangentIndices = listMember<std::uint32_t>(mesh, mesh_schema::tangentIndices());
         tangentIndices && tangents) {
       checkIndexValues(*tangentIndices, tangents->size(), name,
                        "validate |{}| Found tangent index out of range at position {}!");

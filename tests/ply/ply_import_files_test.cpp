@@ -108,8 +108,9 @@ std::vector<std::vector<std::uint32_t>> importedFaces(base::AttribMap& mesh) {
     const base::AttribMap& primitive = *scene::mapAt(*primitives, p);
     const scene::FaceCounts counts = scene::faceCountsOf(primitive);
     if (!counts.present() || primitive.findMember(scene::meshPrimitive_schema::ecounts())) continue;
-    std::uint32_t at = *scene::uint32Member(primitive, scene::meshPrimitive_schema::indexStart());
-    const std::uint32_t end = at + *scene::uint32Member(primitive, scene::meshPrimitive_schema::indexCount());
+    std::uint32_t at = *scene::scalarMember<std::uint32_t>(primitive, scene::meshPrimitive_schema::indexStart());
+    const std::uint32_t end =
+        at + *scene::scalarMember<std::uint32_t>(primitive, scene::meshPrimitive_schema::indexCount());
     for (std::size_t f = 0; at < end; ++f) {
       const std::uint32_t n = counts.perFace ? (*counts.perFace)[f] : *counts.uniform;
       faces.emplace_back(indices->begin() + at, indices->begin() + at + n);
