@@ -96,7 +96,16 @@ void readValue(Stream& stream, T& value) {
     value.resize(binary::readCount(stream, 1, "text bytes"));
     binary::read(stream, value.data(), value.size());
   } else {
-    forEachComponent(value, [&stream](auto& component) { binary::read(stream, &component, sizeof component); });
+    forEachComponent(value, [&stream](auto& component) {
+      if constexpr (std::is_same_v<std::remove_cvref_t<decltype(component)>, bool>) {
+        // A stored bool is one byte; any byte but 0 reads as true, never as a bool that is neither.
+        std::uint8_t byte = 0;
+        binary::read(stream, &byte, 1);
+        component = byte != 0;
+      } else {
+        binary::read(stream, &component, sizeof component);
+      }
+    });
   }
 }
 

@@ -165,8 +165,23 @@ TEST(AttributeBinary, TruncatedAndHostileInputsFailCleanly) {
   EXPECT_LE(list.values().capacity(), 1u << 16);
 }
 
-// The library is MurmurHash3 x86 128-bit: its published verification value (each prefix of
-// 0..255 hashed with seed 256 - length, then the digests hashed) must come out.
+// A stored bool byte other than 0 or 1 reads as true and is written back as 1.
+TEST(AttributeBinary, BoolBytesOtherThanZeroAndOneReadAsTrue) {
+  for (std::uint8_t stored : {1, 2, 0x80}) {
+    const base::vector<std::uint8_t> bytes = {0, stored};
+    base::TypedAttribute<bool> flag;
+    base::Stream source = base::memStream(bytes.data(), static_cast<std::int64_t>(bytes.size()));
+    flag.read(source, base::plainContext());
+    EXPECT_TRUE(flag.value()) << int(stored);
+    base::Stream written = base::memStream(0);
+    flag.write(written, base::plainContext());
+    std::uint8_t back[2] = {};
+    written.setPosition(0);
+    written.read(back, 2);
+    EXPECT_EQ(back[1], 1) << int(stored);
+  }
+}
+
 // MurmurHash3 x86 128-bit: its published verification value (each prefix of 0..255 hashed
 // with seed 256 - length, then the digests hashed) must come out.
 TEST(AttributeHash, TheHashIsMurmurHash3X86_128) {
