@@ -26,6 +26,13 @@ ByteWindow::ByteWindow(base::Stream& stream, std::uint32_t capacity)
     m_end = block ? block + offset + size : nullptr;
     return;
   }
+  // A small file needs no more than its own size and a byte to see its end; every item of
+  // any type still fits.
+  constexpr std::size_t smallest = 4096;
+  if (stream.has(base::capSize) && m_capacity > smallest) {
+    const auto left = static_cast<std::uint64_t>(std::max<std::int64_t>(stream.getSize() - m_origin, 0));
+    m_capacity = static_cast<std::size_t>(std::clamp<std::uint64_t>(left + 1, smallest, m_capacity));
+  }
   m_buffer.resize(m_capacity);
   m_begin = m_cursor = m_end = m_buffer.data();
 }

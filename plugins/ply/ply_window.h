@@ -1,10 +1,13 @@
 #pragma once
 
+#include "b_alloc.h"
 #include "b_stream.h"
 
 #include <cstddef>
 #include <cstdint>
+#include <new>
 #include <optional>
+#include <vector>
 
 namespace ply {
 
@@ -15,6 +18,16 @@ namespace ply {
 /// (when it can position); a stream that cannot go back that far is logged (debug level),
 /// never thrown.
 class ByteWindow {
+  // Every byte of the buffer is written by a read before it is looked at, so making room
+  // leaves the bytes as they are instead of zeroing them first.
+  struct UnfilledBytes : base::Allocator<std::uint8_t> {
+    template <class U>
+    struct rebind {
+      using other = UnfilledBytes;
+    };
+    void construct(std::uint8_t* byte) noexcept { ::new (static_cast<void*>(byte)) std::uint8_t; }
+  };
+
  public:
   static constexpr std::uint32_t defaultCapacity = 0x40000;
 
@@ -70,7 +83,7 @@ class ByteWindow {
   const std::uint8_t* failShort(std::size_t count);
 
   base::Stream& m_stream;
-  base::vector<std::uint8_t> m_buffer;
+  std::vector<std::uint8_t, UnfilledBytes> m_buffer;
   const std::uint8_t* m_begin = nullptr;
   const std::uint8_t* m_cursor = nullptr;
   const std::uint8_t* m_end = nullptr;
