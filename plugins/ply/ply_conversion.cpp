@@ -145,6 +145,12 @@ bool PLYImporter::prepareVertices(const Element& element) {
   base::vector<base::base_vec3<float>>* positions = nullptr;
   base::vector<base::normal>* normals = nullptr;
   if (has(element, PropertySemantic::x)) {
+    // A file may hold several vertex elements; the last one's positions are the mesh's, so
+    // say that the earlier ones are no longer there.
+    if (m_positionsList) {
+      base::log().message(base::logScene, base::logWarning,
+                          "Element 'vertex' appears again: its data replaces the earlier one's");
+    }
     positions = m_positionsList = &newMeshList<base::base_vec3<float>>(mesh, mesh_schema::positions(), count);
     wanted = true;
   }

@@ -46,7 +46,7 @@ std::vector<std::string> filesIn(const char* folder) {
 std::map<std::string, std::string> expectedOutcomes() {
   const std::string readme = fileText(dataFolder / "README.md");
   const std::string table = readme.substr(readme.find("## invalid/"));
-  const std::regex row(R"(\n\| `([a-z_]+)\.ply` \| [^|]* \| ([^|]*) \|)");
+  const std::regex row(R"(\n\| `([a-z0-9_]+)\.ply` \| [^|]* \| ([^|]*) \|)");
   std::map<std::string, std::string> outcomes;
   for (std::sregex_iterator it(table.begin(), table.end(), row), end; it != end; ++it) {
     outcomes[(*it)[1]] = (*it)[2];

@@ -1,0 +1,71 @@
+// Importing a file of N bytes never needs more than a small multiple of N plus a fixed
+// amount: every test file is imported in a child process whose address space is limited to
+// what it already holds, 64 MiB and 16 times the file's size. An allocation beyond that
+// fails, and the child reports it by its exit status.
+
+#include "b_exception.h"
+#include "log_capture.h"
+#include "scene_import.h"
+
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <new>
+
+#if !defined(_WIN32)
+#  include <sys/resource.h>
+#  include <unistd.h>
+
+#  include <fstream>
+#endif
+
+namespace {
+
+namespace stdfs = std::filesystem;
+
+#if !defined(_WIN32) && !defined(__SANITIZE_ADDRESS__)
+
+constexpr std::uint64_t fixedBytes = 64u << 20;
+constexpr std::uint64_t bytesPerFileByte = 16;
+constexpr int allocationFailed = 3;
+
+std::uint64_t addressSpaceInUse() {
+  std::uint64_t pages = 0;
+  std::ifstream("/proc/self/statm") >> pages;
+  return pages * static_cast<std::uint64_t>(sysconf(_SC_PAGESIZE));
+}
+
+[[noreturn]] void importUnderLimit(const stdfs::path& path) {
+  testing_support::LogCapture quiet;
+  const rlimit limit{addressSpaceInUse() + fixedBytes + bytesPerFileByte * stdfs::file_size(path), RLIM_INFINITY};
+  setrlimit(RLIMIT_AS, &limit);
+  std::set_new_handler([] { _exit(allocationFailed); });
+  try {
+    testing_support::importFile(path.string());
+  } catch (const base::exception&) {
+    // A refusal is a fine answer; running out of memory is not.
+  } catch (const std::bad_alloc&) {
+    _exit(allocationFailed);
+  }
+  _exit(0);
+}
+
+TEST(MemoryBound, EveryTestFileImportsWithinASmallMultipleOfItsSize) {
+  testing_support::pluginFactory();  // loaded before the limit, as a host loads it at start-up
+  for (const char* folder : {"valid", "invalid"}) {
+    for (const auto& entry : stdfs::directory_iterator(stdfs::path(MESHPORT_TEST_DATA) / "ply" / folder)) {
+      if (entry.path().extension() != ".ply") continue;
+      EXPECT_EXIT(importUnderLimit(entry.path()), ::testing::ExitedWithCode(0), "^$") << entry.path();
+    }
+  }
+}
+
+#else
+
+TEST(MemoryBound, EveryTestFileImportsWithinASmallMultipleOfItsSize) {
+  GTEST_SKIP() << "address-space limits need POSIX and a build without AddressSanitizer";
+}
+
+#endif
+
+}  // namespace
