@@ -33,8 +33,16 @@ ByteWindow::ByteWindow(base::Stream& stream, std::uint32_t capacity)
     const auto left = static_cast<std::uint64_t>(std::max<std::int64_t>(stream.getSize() - m_origin, 0));
     m_capacity = static_cast<std::size_t>(std::clamp<std::uint64_t>(left + 1, smallest, m_capacity));
   }
-  m_buffer.resize(m_capacity);
-  m_begin = m_cursor = m_end = m_buffer.data();
+  resizeBuffer(m_capacity);
+  m_begin = m_cursor = m_end = m_buffer.get();
+}
+
+void ByteWindow::resizeBuffer(std::size_t size) {
+  std::unique_ptr<std::uint8_t[], FreeBytes> grown(static_cast<std::uint8_t*>(
+      base::StdAllocPolicy::allocateBytes(size, __FILE__, __LINE__, "ply::ByteWindow::resizeBuffer")));
+  if (m_bufferSize) std::memcpy(grown.get(), m_buffer.get(), std::min(size, m_bufferSize));
+  m_buffer = std::move(grown);
+  m_bufferSize = size;
 }
 
 ByteWindow::~ByteWindow() {
@@ -75,16 +83,16 @@ bool ByteWindow::refill(std::size_t count) {
   // Keep one consumed byte so that unget() works across a refill.
   const std::size_t keep = m_cursor > m_begin ? 1 : 0;
   const std::size_t unread = static_cast<std::size_t>(m_end - m_cursor);
-  const std::size_t from = static_cast<std::size_t>(m_cursor - m_buffer.data()) - keep;
+  const std::size_t from = static_cast<std::size_t>(m_cursor - m_buffer.get()) - keep;
   m_consumedBefore += static_cast<std::uint64_t>(m_cursor - m_begin) - keep;
   // Growing moves the block: the pointers are rebuilt from offsets below.
-  if (keep + count > m_buffer.size()) m_buffer.resize(keep + count);
-  std::uint8_t* front = m_buffer.data();
+  if (keep + count > m_bufferSize) resizeBuffer(keep + count);
+  std::uint8_t* front = m_buffer.get();
   std::memmove(front, front + from, keep + unread);
   m_begin = front;
   m_cursor = front + keep;
   std::uint8_t* fill = front + keep + unread;
-  const std::uint8_t* limit = front + m_buffer.size();
+  const std::uint8_t* limit = front + m_bufferSize;
   while (static_cast<std::size_t>(fill - m_cursor) < count) {
     const std::uint32_t got = m_stream.worker()->read(fill, static_cast<std::uint32_t>(limit - fill));
     if (got == 0) break;
@@ -111,7 +119,7 @@ bool ByteWindow::skip(std::uint64_t count) {
   if (count > inWindow && !m_inMemory && m_stream.has(base::capPosition) && left && *left >= count) {
     m_consumedBefore = position() + count;
     m_stream.setPosition(m_origin + static_cast<std::int64_t>(m_consumedBefore));
-    m_begin = m_cursor = m_end = m_buffer.data();
+    m_begin = m_cursor = m_end = m_buffer.get();
     return true;
   }
   for (;;) {

@@ -5,9 +5,8 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <new>
+#include <memory>
 #include <optional>
-#include <vector>
 
 namespace ply {
 
@@ -18,14 +17,8 @@ namespace ply {
 /// (when it can position); a stream that cannot go back that far is logged (debug level),
 /// never thrown.
 class ByteWindow {
-  // Every byte of the buffer is written by a read before it is looked at, so making room
-  // leaves the bytes as they are instead of zeroing them first.
-  struct UnfilledBytes : base::Allocator<std::uint8_t> {
-    template <class U>
-    struct rebind {
-      using other = UnfilledBytes;
-    };
-    void construct(std::uint8_t* byte) noexcept { ::new (static_cast<void*>(byte)) std::uint8_t; }
+  struct FreeBytes {
+    void operator()(std::uint8_t* bytes) const noexcept { base::StdAllocPolicy::deallocateBytes(bytes); }
   };
 
  public:
@@ -80,10 +73,14 @@ class ByteWindow {
 
  private:
   bool refill(std::size_t count);
+  /// Makes the buffer `size` bytes long, keeping its bytes; new bytes are left unfilled, as
+  /// every byte is written by a read before it is looked at.
+  void resizeBuffer(std::size_t size);
   const std::uint8_t* failShort(std::size_t count);
 
   base::Stream& m_stream;
-  std::vector<std::uint8_t, UnfilledBytes> m_buffer;
+  std::unique_ptr<std::uint8_t[], FreeBytes> m_buffer;
+  std::size_t m_bufferSize = 0;
   const std::uint8_t* m_begin = nullptr;
   const std::uint8_t* m_cursor = nullptr;
   const std::uint8_t* m_end = nullptr;
