@@ -1,6 +1,7 @@
 #include "scene_index_delta.h"
 
 #include "b_log.h"
+#include "scene_face_sort.h"
 #include "scene_mesh.h"
 #include "scene_schema.h"
 
@@ -9,8 +10,6 @@
 
 namespace scene {
 namespace {
-
-constexpr std::uint32_t absent = 0xFFFFFFFFu;
 
 // Pass 1: the corner a face starts at, chosen on the first channel.
 std::uint32_t startCorner(const std::uint32_t* f, std::uint32_t n) {
@@ -30,24 +29,9 @@ std::uint32_t startCorner(const std::uint32_t* f, std::uint32_t n) {
   return static_cast<std::uint32_t>(std::min_element(f, f + n) - f);
 }
 
-// Calls `each(offset, n)` for every face of a range, in order.
-template <class Each>
-void forEachFace(std::uint32_t count, std::span<const std::uint16_t> faceCounts, std::uint32_t uniformCount,
-                 Each&& each) {
-  if (faceCounts.empty()) {
-    for (std::uint32_t offset = 0; offset + uniformCount <= count; offset += uniformCount) each(offset, uniformCount);
-    return;
-  }
-  std::uint32_t offset = 0;
-  for (const std::uint16_t n : faceCounts) {
-    each(offset, n);
-    offset += n;
-  }
-}
-
 void rotateFaces(std::span<std::uint32_t* const> channels, std::uint32_t count,
                  std::span<const std::uint16_t> faceCounts, std::uint32_t uniformCount) {
-  forEachFace(count, faceCounts, uniformCount, [&](std::uint32_t offset, std::uint32_t n) {
+  detail::forEachFace(count, faceCounts, uniformCount, [&](std::uint32_t offset, std::uint32_t n) {
     if (n == 2) {
       if (channels[0][offset + 1] < channels[0][offset]) {
         for (std::uint32_t* channel : channels) std::swap(channel[offset], channel[offset + 1]);
@@ -61,81 +45,43 @@ void rotateFaces(std::span<std::uint32_t* const> channels, std::uint32_t count,
   });
 }
 
-template <std::size_t N>
-void sortRecords(std::uint32_t* channel, std::uint32_t count) {
-  auto* records = reinterpret_cast<std::array<std::uint32_t, N>*>(channel);
-  std::sort(records, records + count / N);
-}
-
-struct FaceRecord {
-  std::uint32_t start;
-  std::uint16_t count;
-};
-
-std::array<std::uint32_t, 4> sortKey(const std::uint32_t* f, std::uint32_t n) {
-  return {f[0], n > 1 ? f[1] : absent, n > 2 ? f[2] : absent, n > 3 ? f[3] : absent};
-}
-
-// Pass 2 for several channels or mixed faces: face records sorted, then every channel (and
-// the counts) rewritten in the new order through one scratch buffer.
-void sortFaceRecords(std::span<std::uint32_t* const> channels, std::uint32_t count, std::span<std::uint16_t> faceCounts,
-                     std::uint32_t uniformCount) {
-  base::vector<FaceRecord> faces;
-  forEachFace(count, faceCounts, uniformCount, [&](std::uint32_t offset, std::uint32_t n) {
-    faces.push_back({offset, static_cast<std::uint16_t>(n)});
-  });
-  const std::uint32_t* first = channels[0];
-  std::sort(faces.begin(), faces.end(), [first](const FaceRecord& a, const FaceRecord& b) {
-    return sortKey(first + a.start, a.count) < sortKey(first + b.start, b.count);
-  });
-  base::vector<std::uint32_t> scratch(count);
-  for (std::uint32_t* channel : channels) {
-    std::copy(channel, channel + count, scratch.begin());
-    std::uint32_t at = 0;
-    for (const FaceRecord& face : faces) {
-      std::copy_n(scratch.begin() + face.start, face.count, channel + at);
-      at += face.count;
-    }
-  }
-  for (std::size_t k = 0; k < faceCounts.size(); ++k) faceCounts[k] = faces[k].count;
-}
-
-void sortFaces(std::span<std::uint32_t* const> channels, std::uint32_t count, std::span<std::uint16_t> faceCounts,
-               std::uint32_t uniformCount) {
-  if (faceCounts.empty() && channels.size() == 1 && uniformCount >= 2 && uniformCount <= 4) {
-    if (uniformCount == 2) sortRecords<2>(channels[0], count);
-    if (uniformCount == 3) sortRecords<3>(channels[0], count);
-    if (uniformCount == 4) sortRecords<4>(channels[0], count);
-    return;
-  }
-  sortFaceRecords(channels, count, faceCounts, uniformCount);
-}
-
-// The start of every face, for walking the faces backwards.
-base::vector<std::uint32_t> faceStarts(std::uint32_t count, std::span<const std::uint16_t> faceCounts,
-                                       std::uint32_t uniformCount) {
-  base::vector<std::uint32_t> starts;
-  forEachFace(count, faceCounts, uniformCount, [&](std::uint32_t offset, std::uint32_t) { starts.push_back(offset); });
-  return starts;
-}
-
-std::uint32_t faceSize(std::size_t k, std::span<const std::uint16_t> faceCounts, std::uint32_t uniformCount) {
-  return faceCounts.empty() ? uniformCount : faceCounts[k];
-}
-
 // Pass 3: each face against the previous one, from the last face to the first, so that the
-// previous face still holds plain values.
-void encodeDeltas(std::uint32_t* channel, std::uint32_t count, std::span<const std::uint16_t> faceCounts,
-                  std::uint32_t uniformCount) {
-  const base::vector<std::uint32_t> starts = faceStarts(count, faceCounts, uniformCount);
-  for (std::size_t k = starts.size(); k-- > 0;) {
-    std::uint32_t* f = channel + starts[k];
-    const std::uint32_t* p = k > 0 ? channel + starts[k - 1] : nullptr;
+// previous face still holds plain values. `startOf(k)` and `sizeOf(k)` describe face k.
+template <class StartOf, class SizeOf>
+void encodeFaces(std::uint32_t* channel, std::size_t faces, StartOf startOf, SizeOf sizeOf) {
+  for (std::size_t k = faces; k-- > 0;) {
+    std::uint32_t* f = channel + startOf(k);
+    const std::uint32_t* p = k > 0 ? channel + startOf(k - 1) : nullptr;
     const std::uint32_t base = p && f[0] == p[0] ? p[1] : f[0];
     f[1] -= base;
-    for (std::uint32_t j = 2; j < faceSize(k, faceCounts, uniformCount); ++j) f[j] -= f[0];
+    for (std::uint32_t j = 2; j < sizeOf(k); ++j) f[j] -= f[0];
     if (p) f[0] -= p[0];
   }
+}
+
+void encodeDeltas(std::uint32_t* channel, std::uint32_t count, std::span<const std::uint16_t> faceCounts,
+                  std::uint32_t uniformCount, detail::FaceSortScratch& scratch) {
+  if (faceCounts.empty()) {
+    encodeFaces(
+        channel, count / uniformCount, [uniformCount](std::size_t k) { return k * uniformCount; },
+        [uniformCount](std::size_t) { return uniformCount; });
+    return;
+  }
+  base::vector<std::uint32_t>& starts = scratch.starts;
+  starts.clear();
+  detail::forEachFace(count, faceCounts, uniformCount,
+                      [&](std::uint32_t offset, std::uint32_t) { base::append(starts, offset); });
+  encodeFaces(
+      channel, starts.size(), [&starts](std::size_t k) { return starts[k]; },
+      [faceCounts](std::size_t k) { return std::uint32_t(faceCounts[k]); });
+}
+
+void encodeRange(std::span<std::uint32_t* const> channels, std::uint32_t count, std::span<std::uint16_t> faceCounts,
+                 std::uint32_t uniformCount, detail::FaceSortScratch& scratch) {
+  if (channels.empty() || count == 0) return;
+  rotateFaces(channels, count, faceCounts, uniformCount);
+  detail::sortFaces(channels, count, faceCounts, uniformCount, scratch);
+  encodeDeltas(channels[0], count, faceCounts, uniformCount, scratch);
 }
 
 // The channels of a mesh, first channel first; false (logged where the reason is the
@@ -217,16 +163,14 @@ bool marked(const base::AttribMap& mesh) {
 
 void encodeRangeDeltas(std::span<std::uint32_t* const> channels, std::uint32_t count,
                        std::span<std::uint16_t> faceCounts, std::uint32_t uniformCount) {
-  if (channels.empty() || count == 0) return;
-  rotateFaces(channels, count, faceCounts, uniformCount);
-  sortFaces(channels, count, faceCounts, uniformCount);
-  encodeDeltas(channels[0], count, faceCounts, uniformCount);
+  detail::FaceSortScratch scratch;
+  encodeRange(channels, count, faceCounts, uniformCount, scratch);
 }
 
 void decodeRangeDeltas(std::uint32_t* channel, std::uint32_t count, std::span<const std::uint16_t> faceCounts,
                        std::uint32_t uniformCount) {
   const std::uint32_t* previous = nullptr;
-  forEachFace(count, faceCounts, uniformCount, [&](std::uint32_t offset, std::uint32_t n) {
+  detail::forEachFace(count, faceCounts, uniformCount, [&](std::uint32_t offset, std::uint32_t n) {
     std::uint32_t* f = channel + offset;
     if (previous) f[0] += previous[0];
     const std::uint32_t base = previous && f[0] == previous[0] ? previous[1] : f[0];
@@ -242,11 +186,12 @@ bool encodeIndexDeltas(base::AttribMap& mesh) {
   std::uint32_t length = 0;
   if (!gatherChannels(mesh, channels, length)) return false;
   base::vector<std::uint32_t*> atStart(channels.size());
+  detail::FaceSortScratch scratch;  // one for every range of the mesh
   forEachEncodableRange(
       mesh, length,
       [&](std::uint32_t start, std::uint32_t count, std::span<std::uint16_t> faceCounts, std::uint32_t uniformCount) {
         for (std::size_t c = 0; c < channels.size(); ++c) atStart[c] = channels[c] + start;
-        encodeRangeDeltas(atStart, count, faceCounts, uniformCount);
+        encodeRange(atStart, count, faceCounts, uniformCount, scratch);
       });
   mesh.attribute<bool>(mesh_schema::indicesDeltaCompression(), true);
   return true;

@@ -165,17 +165,33 @@ std::vector<std::vector<std::uint32_t>> canonicalFaces(const Indices& indices,
   return faces;
 }
 
-TEST(IndexDeltas, RandomMeshesDecodeToTheirFacesUpToRotation) {
+// The encoding's face order: by first index, then the next ones (up to four), each face
+// rotated to start at its smallest index.
+bool inEncodingOrder(const Indices& indices, const base::vector<std::uint16_t>& counts) {
+  std::vector<std::vector<std::uint32_t>> keys;
+  std::size_t at = 0;
+  for (const std::uint16_t n : counts) {
+    std::vector<std::uint32_t> key(indices.begin() + at, indices.begin() + at + std::min<std::uint16_t>(n, 4));
+    key.resize(4, 0xFFFFFFFFu);
+    keys.push_back(key);
+    at += n;
+  }
+  return std::is_sorted(keys.begin(), keys.end());
+}
+
+// Dense first indices take the counting sort, with short and long runs of one first index;
+// indices far apart take the comparison sort. Both must give the same order.
+TEST(IndexDeltas, RandomMeshesDecodeToTheirFacesUpToRotationInEncodingOrder) {
   std::mt19937 random(7);
-  for (int round = 0; round < 200; ++round) {
+  for (int round = 0; round < 400; ++round) {
     const bool mixed = round % 2 == 1;
-    const std::uint16_t uniform = static_cast<std::uint16_t>(3 + (round / 2) % 2);
-    base::vector<std::uint16_t> counts(1 + random() % 40);
+    const std::uint16_t uniform = static_cast<std::uint16_t>(2 + (round / 2) % 3);
+    const std::uint32_t vertices = round % 5 == 4 ? 0xFFFFFFF0u : 12;
+    base::vector<std::uint16_t> counts(1 + random() % (round % 3 == 0 ? 400 : 40));
     Indices indices;
     for (std::uint16_t& n : counts) {
       n = mixed ? static_cast<std::uint16_t>(3 + random() % 5) : uniform;
-      // Few vertices, so that faces share first indices often.
-      for (std::uint16_t k = 0; k < n; ++k) indices.push_back(static_cast<std::uint32_t>(random() % 12));
+      for (std::uint16_t k = 0; k < n; ++k) indices.push_back(static_cast<std::uint32_t>(random() % vertices));
     }
     const auto expected = canonicalFaces(indices, counts);
     const auto made = makeMesh(
@@ -185,7 +201,9 @@ TEST(IndexDeltas, RandomMeshesDecodeToTheirFacesUpToRotation) {
     ASSERT_TRUE(scene::decodeIndexDeltas(mesh));
     const scene::FaceCounts after =
         scene::faceCountsOf(*scene::mapAt(*scene::findArrayMember(mesh, mesh_schema::primitives()), 0));
-    EXPECT_EQ(canonicalFaces(indicesOf(mesh), mixed ? *after.perFace : counts), expected) << "round " << round;
+    const base::vector<std::uint16_t>& finalCounts = mixed ? *after.perFace : counts;
+    EXPECT_EQ(canonicalFaces(indicesOf(mesh), finalCounts), expected) << "round " << round;
+    EXPECT_TRUE(inEncodingOrder(indicesOf(mesh), finalCounts)) << "round " << round;
   }
 }
 
