@@ -3,11 +3,18 @@
 // swap the records; ASCII: std::from_chars over every number). Both sides produce the same
 // column arrays from the same file on disk.
 
+#include "b_fs.h"
 #include "ply_bench_files.h"
 #include "ply_parser.h"
 
 #include <benchmark/benchmark.h>
 #include <malloc.h>
+
+#ifdef __linux__
+#  include <fcntl.h>
+#  include <sys/mman.h>
+#  include <unistd.h>
+#endif
 
 #include <algorithm>
 #include <charconv>
@@ -304,17 +311,59 @@ void BM_PlyColumns(benchmark::State& state, Shape shape, Encoding encoding) {
   setRate(state, path);
 }
 
+// Every 4 bytes of a block touched.
+std::uint32_t touch(const char* data, std::size_t size) {
+  std::uint32_t sum = 0;
+  for (std::size_t at = 0; at + 4 <= size; at += 4) sum += load32<false>(data + at);
+  return sum;
+}
+
 // The floor for binary files: the file read into a fresh buffer, and every 4 bytes touched.
 void BM_FloorReadTouch(benchmark::State& state, Shape shape, Encoding encoding) {
   const std::string path = bench::plyFile(shape, encoding);
   for (auto _ : state) {
     const std::vector<char> data = readWhole(path);
+    benchmark::DoNotOptimize(touch(data.data(), data.size()));
+  }
+  setRate(state, path);
+}
+
+// The two ways a reader can get at a file's bytes, each touching every 4 bytes: through the
+// master file system's stream into one reused 256 KiB buffer (the importer's way), and as a
+// view of the whole file mapped into memory.
+void BM_ReadMasterStream(benchmark::State& state, Shape shape, Encoding encoding) {
+  const std::string path = bench::plyFile(shape, encoding);
+  std::vector<char> buffer(1 << 18);
+  for (auto _ : state) {
+    base::Stream stream = base::fs::master().open(path, base::fs::openForReading);
     std::uint32_t sum = 0;
-    for (std::size_t at = 0; at + 4 <= data.size(); at += 4) sum += load32<false>(data.data() + at);
+    while (const std::uint32_t got = stream.read(buffer.data(), static_cast<std::uint32_t>(buffer.size()))) {
+      sum += touch(buffer.data(), got);
+    }
     benchmark::DoNotOptimize(sum);
   }
   setRate(state, path);
 }
+
+#ifdef __linux__
+void BM_ReadMapped(benchmark::State& state, Shape shape, Encoding encoding) {
+  const std::string path = bench::plyFile(shape, encoding);
+  const std::size_t size = std::filesystem::file_size(path);
+  for (auto _ : state) {
+    const int file = open(path.c_str(), O_RDONLY);
+    void* view = mmap(nullptr, size, PROT_READ, MAP_PRIVATE, file, 0);
+    if (view == MAP_FAILED) state.SkipWithError("mmap failed");
+    benchmark::DoNotOptimize(touch(static_cast<const char*>(view), size));
+    munmap(view, size);
+    close(file);
+  }
+  setRate(state, path);
+}
+BENCHMARK_CAPTURE(BM_ReadMapped, mesh_little, Shape::mesh, Encoding::little)->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(BM_ReadMapped, cloud_little, Shape::cloud, Encoding::little)->Unit(benchmark::kMillisecond);
+#endif
+BENCHMARK_CAPTURE(BM_ReadMasterStream, mesh_little, Shape::mesh, Encoding::little)->Unit(benchmark::kMillisecond);
+BENCHMARK_CAPTURE(BM_ReadMasterStream, cloud_little, Shape::cloud, Encoding::little)->Unit(benchmark::kMillisecond);
 
 void BM_FloorReadFile(benchmark::State& state, Shape shape, Encoding encoding) {
   const std::string path = bench::plyFile(shape, encoding);

@@ -2,6 +2,7 @@
 
 #include <fmt/format.h>
 
+#include <array>
 #include <bit>
 #include <cstdint>
 #include <cstdio>
@@ -17,6 +18,11 @@ constexpr int meshTriangles = 2'000'000;
 constexpr int cloudPoints = 2'000'000;
 
 using File = std::unique_ptr<std::FILE, int (*)(std::FILE*)>;
+
+std::array<std::uint32_t, 3> meshFace(int f) {
+  const auto first = static_cast<std::uint32_t>(f / 2);
+  return {first, (first + 1) % meshVertices, (first + 2) % meshVertices};
+}
 
 const char* formatWord(Encoding encoding) {
   switch (encoding) {
@@ -90,11 +96,8 @@ void writeMesh(std::FILE* file, Encoding encoding) {
     out.endLine();
   }
   for (int f = 0; f < meshTriangles; ++f) {
-    const auto first = static_cast<std::uint32_t>(f / 2);
     out.integer(3, 1);
-    for (std::uint32_t index : {first, (first + 1) % meshVertices, (first + 2) % meshVertices}) {
-      out.integer(index, 4, true);
-    }
+    for (std::uint32_t index : meshFace(f)) out.integer(index, 4, true);
     out.endLine();
   }
 }
@@ -130,6 +133,15 @@ std::string plyFile(Shape shape, Encoding encoding) {
   // Renamed only when complete, so an interrupted run never leaves a short file behind.
   std::filesystem::rename(partial, path);
   return path.string();
+}
+
+base::vector<std::uint32_t> meshIndices() {
+  base::vector<std::uint32_t> indices;
+  indices.reserve(std::size_t(meshTriangles) * 3);
+  for (int f = 0; f < meshTriangles; ++f) {
+    for (std::uint32_t index : meshFace(f)) indices.push_back(index);
+  }
+  return indices;
 }
 
 }  // namespace bench

@@ -1,5 +1,8 @@
 #pragma once
 
+#include "b_containers.h"
+
+#include <cstdint>
 #include <string>
 
 namespace bench {
@@ -13,5 +16,8 @@ enum class Encoding { ascii, little, big };
 
 /// The path of the file, writing it first when it is not there yet.
 std::string plyFile(Shape shape, Encoding encoding);
+
+/// The mesh's face indices in the file's order, three per triangle.
+base::vector<std::uint32_t> meshIndices();
 
 }  // namespace bench

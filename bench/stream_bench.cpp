@@ -14,7 +14,7 @@ constexpr std::uint32_t bufferSize = 0x40000;
 // A source that is not in memory as far as the buffers can tell (no 0x40), like a file:
 // every byte must come through read.
 class ColdSource final : public base::StreamWorker {
-public:
+ public:
   explicit ColdSource(const std::vector<char>& data)
       : StreamWorker(base::capRead | base::capPosition | base::capSize, "cold"), m_data(data) {}
   std::uint32_t read(void* buffer, std::uint32_t count) override {
@@ -31,7 +31,7 @@ public:
   std::int64_t getSize() override { return static_cast<std::int64_t>(m_data.size()); }
   bool isEOF() override { return m_position >= m_data.size(); }
 
-private:
+ private:
   const std::vector<char>& m_data;
   std::size_t m_position = 0;
 };

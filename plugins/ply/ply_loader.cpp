@@ -120,7 +120,9 @@ bool PLYImporter::importScene(base::PluginFactory& factory, std::string_view pat
     base::raise<base::exception>("ply::PLYImporter::importScene", fmt::format("{}: the PLY header is invalid", path));
   }
   finishPrimitives();
+  base::log().message(base::logScene, base::logDebug, "Encoding the index deltas.");
   scene::encodeIndexDeltas(*m_currentMesh);
+  base::log().message(base::logScene, base::logDebug, "Building the scene.");
   createMaterials(factory);
   buildScene(factory);
   return true;
