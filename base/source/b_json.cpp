@@ -4,11 +4,16 @@
 
 #include <fmt/format.h>
 #include <rapidjson/document.h>
+#include <rapidjson/encodedstream.h>
 #include <rapidjson/error/en.h>
+#include <rapidjson/memorystream.h>
+#include <rapidjson/reader.h>
 #include <rapidjson/stringbuffer.h>
 #include <rapidjson/writer.h>
 
+#include <charconv>
 #include <cmath>
+#include <cstdint>
 #include <limits>
 #include <vector>
 
@@ -109,13 +114,107 @@ struct JsonReader::Impl {
   }
 };
 
-JsonReader::JsonReader(std::string_view text) : m_impl(std::make_unique<Impl>()) {
-  m_impl->document.Parse<rapidjson::kParseFullPrecisionFlag | rapidjson::kParseIterativeFlag>(text.data(), text.size());
-  if (m_impl->document.HasParseError()) {
-    raise<exception>("base::JsonReader::JsonReader",
-                     fmt::format("JSON parse error at byte {}: {}", m_impl->document.GetErrorOffset(),
-                                 rapidjson::GetParseError_En(m_impl->document.GetParseError())));
+namespace {
+
+// Builds a document from rapidjson's reader with every number converted by std::from_chars,
+// which is exact and bounded: rapidjson's own full-precision conversion (Debian's 1.1.0)
+// reads outside its tables on some long numbers. Integers keep their integer kind; those
+// beyond 64 bits become doubles, as rapidjson makes them.
+class ExactNumbers {
+ public:
+  explicit ExactNumbers(std::string_view text) : m_text(text) {}
+
+  template <class Document>
+  bool operator()(Document& document) {
+    Forward<Document> handler{document, m_outOfRange};
+    rapidjson::MemoryStream memory(m_text.data(), m_text.size());
+    rapidjson::EncodedInputStream<rapidjson::UTF8<>, rapidjson::MemoryStream> input(memory);
+    rapidjson::Reader reader;
+    m_result = reader.Parse<rapidjson::kParseNumbersAsStringsFlag | rapidjson::kParseIterativeFlag>(input, handler);
+    return !m_result.IsError();
   }
+
+  /// The failure's text, or empty when the text was read.
+  std::string error() const {
+    if (!m_result.IsError()) return {};
+    const char* cause = m_outOfRange ? "number out of range" : rapidjson::GetParseError_En(m_result.Code());
+    return fmt::format("JSON parse error at byte {}: {}", m_result.Offset(), cause);
+  }
+
+ private:
+  template <class Document>
+  struct Forward {
+    Document& document;
+    bool& outOfRange;
+
+    bool Null() { return document.Null(); }
+    bool Bool(bool value) { return document.Bool(value); }
+    bool Int(int value) { return document.Int(value); }
+    bool Uint(unsigned value) { return document.Uint(value); }
+    bool Int64(std::int64_t value) { return document.Int64(value); }
+    bool Uint64(std::uint64_t value) { return document.Uint64(value); }
+    bool Double(double value) { return document.Double(value); }
+    bool String(const char* text, rapidjson::SizeType length, bool copy) { return document.String(text, length, copy); }
+    bool Key(const char* text, rapidjson::SizeType length, bool copy) { return document.Key(text, length, copy); }
+    bool StartObject() { return document.StartObject(); }
+    bool EndObject(rapidjson::SizeType members) { return document.EndObject(members); }
+    bool StartArray() { return document.StartArray(); }
+    bool EndArray(rapidjson::SizeType elements) { return document.EndArray(elements); }
+    bool RawNumber(const char* text, rapidjson::SizeType length, bool) {
+      const std::string_view number(text, length);
+      const bool integer = number.find_first_of(".eE") == std::string_view::npos;
+      if (integer && number.front() == '-') {
+        if (std::int64_t value = 0; parsed(number, value)) return document.Int64(value);
+      } else if (integer) {
+        if (std::uint64_t value = 0; parsed(number, value)) return document.Uint64(value);
+      }
+      double value = 0;
+      if (parsed(number, value)) return document.Double(value);
+      // Beyond a double: a number too close to zero reads as zero, a too large one is refused.
+      if (underflows(number)) return document.Double(number.front() == '-' ? -0.0 : 0.0);
+      outOfRange = true;
+      return false;
+    }
+  };
+
+  // Whether a number that no double holds lies below 1 in magnitude: its first significant
+  // digit's power of ten (counted from the digits around the point, plus the exponent) is
+  // negative.
+  static bool underflows(std::string_view number) {
+    const std::size_t exponentAt = std::min(number.find_first_of("eE"), number.size());
+    const std::string_view digits = number.substr(0, exponentAt);
+    const std::size_t point = std::min(digits.find('.'), digits.size());
+    const std::size_t first = digits.find_first_of("123456789");
+    std::int64_t power = first < point ? std::int64_t(point - first) - 1 : -std::int64_t(first - point);
+    if (exponentAt < number.size()) {
+      std::string_view written = number.substr(exponentAt + 1);
+      const bool negative = written.front() == '-';
+      if (written.front() == '-' || written.front() == '+') written.remove_prefix(1);
+      std::int64_t exponent = 0;
+      // An exponent beyond 64 bits is as good as infinite.
+      if (!parsed(written, exponent)) exponent = std::numeric_limits<std::int64_t>::max() / 2;
+      power += negative ? -exponent : std::min(exponent, std::numeric_limits<std::int64_t>::max() / 2);
+    }
+    return power < 0;
+  }
+
+  template <class T>
+  static bool parsed(std::string_view number, T& value) {
+    const auto [end, error] = std::from_chars(number.data(), number.data() + number.size(), value);
+    return error == std::errc() && end == number.data() + number.size();
+  }
+
+  std::string_view m_text;
+  rapidjson::ParseResult m_result;
+  bool m_outOfRange = false;
+};
+
+}  // namespace
+
+JsonReader::JsonReader(std::string_view text) : m_impl(std::make_unique<Impl>()) {
+  ExactNumbers parse(text);
+  m_impl->document.Populate(parse);
+  if (const std::string error = parse.error(); !error.empty()) raise<exception>("base::JsonReader::JsonReader", error);
 }
 
 JsonReader::~JsonReader() = default;

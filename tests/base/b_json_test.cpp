@@ -145,4 +145,33 @@ TEST(Json, MalformedAndDeeplyNestedInputs) {
   EXPECT_NE(fromJson("map"_n, deepMaps), nullptr);
 }
 
+// Numbers are converted exactly, keep their integer kind while they fit in 64 bits, and a
+// number no double holds is refused; long numbers with long exponents (which once read
+// outside the number parser's tables) read or fail cleanly.
+TEST(Json, NumbersReadExactlyAndOutOfRangeOnesAreRefused) {
+  base::JsonReader reader("[0.1, -0, 18446744073709551615, 18446744073709551616, -9223372036854775809, 5e-324]");
+  std::size_t size = 0;
+  ASSERT_TRUE(reader.beginArray(size));
+  double real = 0;
+  std::int64_t negative = 1;
+  std::uint64_t unsignedValue = 0;
+  EXPECT_TRUE(reader.value(real) && real == 0.1);
+  EXPECT_TRUE(reader.value(negative) && negative == 0);
+  EXPECT_TRUE(reader.value(unsignedValue) && unsignedValue == 18446744073709551615u);
+  EXPECT_TRUE(reader.value(real) && real == 18446744073709551616.0);
+  EXPECT_TRUE(reader.value(real) && real == -9223372036854775809.0);
+  EXPECT_TRUE(reader.value(real) && real == 5e-324);
+  try {
+    base::JsonReader tooLarge("[1, 1.8e308]");
+    FAIL();
+  } catch (const base::exception& error) {
+    EXPECT_STREQ(error.what(), "JSON parse error at byte 4: number out of range");
+  }
+  base::JsonReader tiny("[500000000000100000.777770000775044444e-000000000000000000000000350, -0.0001e-330, 50e-00]");
+  ASSERT_TRUE(tiny.beginArray(size));
+  EXPECT_TRUE(tiny.value(real) && real == 0 && !std::signbit(real));
+  EXPECT_TRUE(tiny.value(real) && real == 0 && std::signbit(real));
+  EXPECT_TRUE(tiny.value(real) && real == 50);
+}
+
 }  // namespace
