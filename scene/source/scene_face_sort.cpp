@@ -70,14 +70,52 @@ bool placeAndSort(Record* records, std::size_t count, Less less, FaceSortScratch
   const auto first = [](const Record& r) { return r[0]; };
   if (!countKeys(records, count, first, scratch.starts)) return false;
   scratch.next.assign(scratch.starts.begin(), scratch.starts.end());
+  std::uint32_t* next = scratch.next.data();
   for (std::uint32_t k = 0; k + 1 < scratch.starts.size(); ++k) {
-    while (scratch.next[k] < scratch.starts[k + 1]) {
-      Record carried = records[scratch.next[k]];
-      while (carried[0] != k) std::swap(carried, records[scratch.next[carried[0]]++]);
-      records[scratch.next[k]++] = carried;
+    // Only this loop fills run k now (earlier runs are full), so its place stays local.
+    std::uint32_t at = next[k];
+    for (const std::uint32_t end = scratch.starts[k + 1]; at < end; ++at) {
+      if (records[at][0] == k) continue;
+      Record carried = records[at];
+      while (carried[0] != k) std::swap(carried, records[next[carried[0]]++]);
+      records[at] = carried;
     }
+    next[k] = at;
   }
   sortRuns(records, scratch.starts, less);
+  return true;
+}
+
+// Records that are in order but for a few (as files often hold faces, and as exported
+// meshes always do): the records below the largest one kept so far are lifted out, the
+// others closed up, and the lifted ones sorted and merged back in from the end. Only the
+// lifted records are copied. False, with nothing moved, when more than one in 64 would be.
+template <class Record>
+bool mergeFewOutOfOrder(Record* records, std::size_t count, FaceSortScratch& scratch) {
+  const std::size_t allowed = count / 64 + 16;
+  std::size_t outOfOrder = 0;
+  for (std::size_t i = 1, kept = 0; i < count; ++i) {
+    if (!(records[i] < records[kept])) {
+      kept = i;
+    } else if (++outOfOrder > allowed) {
+      return false;
+    }
+  }
+  if (outOfOrder == 0) return true;
+  scratch.indices.resize(outOfOrder * std::tuple_size_v<Record>);
+  auto* lifted = reinterpret_cast<Record*>(scratch.indices.data());
+  std::size_t kept = 1, taken = 0;
+  for (std::size_t i = 1; i < count; ++i) {
+    if (records[i] < records[kept - 1]) {
+      lifted[taken++] = records[i];
+    } else {
+      records[kept++] = records[i];
+    }
+  }
+  std::sort(lifted, lifted + taken);
+  for (std::size_t out = count; taken > 0;) {
+    records[--out] = kept > 0 && lifted[taken - 1] < records[kept - 1] ? records[--kept] : lifted[--taken];
+  }
   return true;
 }
 
@@ -87,6 +125,7 @@ void sortUniform(std::uint32_t* channel, std::uint32_t count, FaceSortScratch& s
   using Record = std::array<std::uint32_t, N>;
   auto* records = reinterpret_cast<Record*>(channel);
   const std::size_t faces = count / N;
+  if (faces < 2 || mergeFewOutOfOrder(records, faces, scratch)) return;
   if (!placeAndSort(records, faces, std::less<Record>(), scratch)) std::sort(records, records + faces);
 }
 
