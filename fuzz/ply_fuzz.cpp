@@ -3,11 +3,11 @@
 // Each source is read twice, once with a column plan for every element and once with every
 // value delivered to the receiver; both must read the same values, or the target aborts.
 
+#include "plan_values.h"
 #include "ply_parser.h"
 #include "ply_plan.h"
 
 #include <algorithm>
-#include <bit>
 #include <cstddef>
 #include <cstdint>
 #include <cstdio>
@@ -16,6 +16,8 @@
 #include <vector>
 
 namespace {
+
+using testing_support::storedBits;
 
 constexpr std::uint32_t longestPlannedList = 65535;
 
@@ -48,18 +50,6 @@ struct ElementValues {
 // The conversion a scalar gets depends on its position, so that each is exercised.
 ply::Conversion conversionOf(std::size_t property) { return static_cast<ply::Conversion>(property % 3); }
 
-std::uint32_t converted(const ply::Value& value, const ply::Property& property, ply::Conversion conversion) {
-  switch (conversion) {
-    case ply::Conversion::toFloat:
-      return std::bit_cast<std::uint32_t>(value.convertTo<float>(property.type));
-    case ply::Conversion::normalised:
-      return std::bit_cast<std::uint32_t>(ply::toFP(value, property));
-    case ply::Conversion::toIndex:
-      break;
-  }
-  return static_cast<std::uint32_t>(value.convertTo<std::int64_t>(property.type));
-}
-
 // Receives every value one by one and stores it where the plan below would.
 struct Delivered {
   std::vector<ElementValues> elements;
@@ -74,16 +64,16 @@ struct Delivered {
     const auto p = static_cast<std::size_t>(&property - element.properties.data());
     ElementValues& target = elements.back();
     if (!property.isList) {
-      store(target, element, p, converted(values[0], property, conversionOf(p)));
+      store(target, element, p, storedBits(values[0], property, conversionOf(p)));
     } else if (property.semantic == ply::PropertySemantic::vertexIndex && values.size() <= longestPlannedList) {
       for (const ply::Value& value : values)
-        base::append(target.indices, converted(value, property, ply::Conversion::toIndex));
+        base::append(target.indices, storedBits(value, property, ply::Conversion::toIndex));
       base::append(target.counts, static_cast<std::uint16_t>(values.size()));
     } else if (property.semantic != ply::PropertySemantic::vertexIndex && values.size() == 3) {
       std::vector<std::uint32_t>& triples = target.triples[p];
       triples.resize(std::max<std::size_t>(triples.size(), (std::size_t(instance) + 1) * 3));
       for (std::size_t k = 0; k < 3; ++k) {
-        triples[std::size_t(instance) * 3 + k] = converted(values[k], property, ply::Conversion::toFloat);
+        triples[std::size_t(instance) * 3 + k] = storedBits(values[k], property, ply::Conversion::toFloat);
       }
     } else {
       deliver(target, p, property, values);
@@ -92,7 +82,7 @@ struct Delivered {
 
   void deliver(ElementValues& target, std::size_t p, const ply::Property& property, const ply::ValueArray& values) {
     std::vector<std::uint32_t> list{instance, static_cast<std::uint32_t>(p)};
-    for (const ply::Value& value : values) list.push_back(converted(value, property, ply::Conversion::toIndex));
+    for (const ply::Value& value : values) list.push_back(storedBits(value, property, ply::Conversion::toIndex));
     target.delivered.push_back(std::move(list));
   }
 

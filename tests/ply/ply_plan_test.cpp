@@ -3,6 +3,7 @@
 // with the same columns, indices, delivered values and log, for every file and source.
 
 #include "log_capture.h"
+#include "plan_values.h"
 #include "ply_parser.h"
 #include "test_streams.h"
 
@@ -10,7 +11,6 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <bit>
 #include <cctype>
 #include <cstring>
 #include <filesystem>
@@ -19,6 +19,8 @@
 #include <sstream>
 
 namespace {
+
+using testing_support::storedBits;
 
 using namespace std::string_literals;
 using testing_support::allSources;
@@ -57,18 +59,6 @@ ply::PropertyPlan planFor(const ply::Element& element, std::size_t p) {
     plan.conversion = static_cast<ply::Conversion>(p % 3);
   }
   return plan;
-}
-
-std::uint32_t storedBits(const ply::Value& value, const ply::Property& property, ply::Conversion conversion) {
-  switch (conversion) {
-    case ply::Conversion::toFloat:
-      return std::bit_cast<std::uint32_t>(value.convertTo<float>(property.type));
-    case ply::Conversion::normalised:
-      return std::bit_cast<std::uint32_t>(ply::toFP(value, property));
-    case ply::Conversion::toIndex:
-      break;
-  }
-  return static_cast<std::uint32_t>(value.convertTo<std::int64_t>(property.type));
 }
 
 std::string valuesText(const ply::ValueArray& values, const ply::Property& property) {
