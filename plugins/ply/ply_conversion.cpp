@@ -52,9 +52,19 @@ bool colourChannel(PropertySemantic s, std::uint32_t& family, std::uint32_t& cha
   return false;
 }
 
+// Other tools name texture coordinates texture_u/texture_v or texture_s/texture_t; they fill
+// a UV set like u and v. The header keeps them as unknown names: only the import reads them
+// as coordinates.
+PropertySemantic importedSemantic(const Property& property) {
+  if (property.semantic != PropertySemantic::unknown) return property.semantic;
+  if (property.name == "texture_u" || property.name == "texture_s") return PropertySemantic::u;
+  if (property.name == "texture_v" || property.name == "texture_t") return PropertySemantic::v;
+  return PropertySemantic::unknown;
+}
+
 std::size_t countOf(const Element& element, bool (*test)(PropertySemantic)) {
   return static_cast<std::size_t>(std::count_if(element.properties.begin(), element.properties.end(),
-                                                [test](const Property& p) { return test(p.semantic); }));
+                                                [test](const Property& p) { return test(importedSemantic(p)); }));
 }
 
 bool has(const Element& element, PropertySemantic semantic) {
@@ -227,7 +237,7 @@ void PLYImporter::routeVertexProperties(const Element& element, std::uint32_t po
       if (target != noTarget) route = Route{Route::Kind::value, conversion, target, offset};
     };
     std::uint32_t family = 0, channel = 0;
-    switch (property.semantic) {
+    switch (importedSemantic(property)) {
       case PropertySemantic::x:
       case PropertySemantic::y:
       case PropertySemantic::z:

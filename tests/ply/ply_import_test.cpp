@@ -140,6 +140,33 @@ TEST(PlyImport, ColoursNormalsAndTextureCoordinates) {
             (base::base_vec2<float>{0.75f, 1.0f}));
 }
 
+// texture_u/texture_v and texture_s/texture_t are texture coordinates too, in the import
+// only: both ways of reading give the same sets, in property order, from binary and ASCII.
+TEST(PlyImport, TextureNamesOfOtherToolsFillUVSets) {
+  const std::string header =
+      "element vertex 2\nproperty float x\nproperty float y\nproperty float z\n"
+      "property float texture_u\nproperty float texture_v\nproperty float u\nproperty float v\n"
+      "property double texture_s\nproperty double texture_t\nend_header\n";
+  const std::string body = "0 0 0 0.25 0.5 1 2 0.125 0.0625\n1 1 1 0.75 1 3 4 0.5 0.375\n";
+  for (bool plans : {true, false}) {
+    LogCapture log(base::logWarning);
+    ImportedScene imported = importText(asciiHeader + header + body, plans);
+    base::AttribMap& mesh = imported.mesh();
+    ASSERT_EQ(arraySize(mesh, mesh_schema::uvSets()), 3u);
+    using UV = base::base_vec2<float>;
+    EXPECT_EQ((setList<UV>(mesh, mesh_schema::uvSets(), 0, meshUVSet_schema::UV())),
+              (base::vector<UV>{{0.25f, 0.5f}, {0.75f, 1}}));
+    EXPECT_EQ((setList<UV>(mesh, mesh_schema::uvSets(), 1, meshUVSet_schema::UV())),
+              (base::vector<UV>{{1, 2}, {3, 4}}));
+    EXPECT_EQ((setList<UV>(mesh, mesh_schema::uvSets(), 2, meshUVSet_schema::UV())),
+              (base::vector<UV>{{0.125f, 0.0625f}, {0.5f, 0.375f}}));
+    // The header still calls them unknown, as it names them for everyone else.
+    EXPECT_EQ(std::count_if(log.entries.begin(), log.entries.end(),
+                            [](const auto& entry) { return entry.text.find("texture_") != std::string::npos; }),
+              4);
+  }
+}
+
 TEST(PlyImport, ColourGroupsWithAndWithoutAlphaStayApart) {
   ImportedScene imported =
       importText(asciiHeader +
