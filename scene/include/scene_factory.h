@@ -32,6 +32,9 @@ class SceneFactory : public base::PluginFactory {
   void unloadPlugins();
 
   bool getImporterParameters(std::string_view path, base::AttribMap& parameters);
+  /// The importer's (or exporter's) parameters of one registered plug-in, with their
+  /// defaults; false when the plug-in has no such side.
+  bool getPluginParameters(IScenePluginDesc& descriptor, bool importers, base::AttribMap& parameters);
   bool getExporterParameters(std::string_view path, base::AttribMap& parameters);
   /// Imports `path` into `scene` with the parameters; false when no plug-in reads it or the
   /// import failed. A path without an extension throws base::exception.

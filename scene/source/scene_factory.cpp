@@ -229,6 +229,18 @@ bool SceneFactory::getImporterParameters(std::string_view path, base::AttribMap&
   return true;
 }
 
+bool SceneFactory::getPluginParameters(IScenePluginDesc& descriptor, bool importers, base::AttribMap& parameters) {
+  const auto index = static_cast<std::uint32_t>(objects().size());
+  const base::ref<base::IPlugin> object(descriptor.create(this, index));
+  if (!object) return false;
+  ISceneImporter* importer = importers ? importerOf(*object) : nullptr;
+  ISceneExporter* exporter = importers ? nullptr : exporterOf(*object);
+  if (importer) importer->getParameters(parameters);
+  if (exporter) exporter->getParameters(parameters);
+  discard(index);
+  return importer || exporter;
+}
+
 bool SceneFactory::getExporterParameters(std::string_view path, base::AttribMap& parameters) {
   const base::string extension = lowerCase(base::getExtension(path, true));
   if (extension.empty()) {
@@ -236,14 +248,10 @@ bool SceneFactory::getExporterParameters(std::string_view path, base::AttribMap&
                                  "mesh factory: Can't save meshes without an extension!");
   }
   for (const base::ref<IScenePluginDesc>& descriptor : m_scenePlugins) {
-    if (!matchesExtension(extension, descriptor->getExporterExtensions())) continue;
-    const auto index = static_cast<std::uint32_t>(objects().size());
-    const base::ref<base::IPlugin> object(descriptor->create(this, index));
-    if (!object) continue;
-    ISceneExporter* exporter = exporterOf(*object);
-    if (exporter) exporter->getParameters(parameters);
-    discard(index);
-    if (exporter) return true;
+    if (matchesExtension(extension, descriptor->getExporterExtensions()) &&
+        getPluginParameters(*descriptor, false, parameters)) {
+      return true;
+    }
   }
   return false;
 }

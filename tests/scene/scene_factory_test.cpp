@@ -147,6 +147,16 @@ TEST_F(SceneFactoryTest, ParametersAndSaving) {
   EXPECT_EQ(*exportParameters.findAttribute<base::string>(base::intern("parametersFrom")), "AlphaImporter");
   EXPECT_FALSE(factory.getExporterParameters("out.beta", exportParameters));
 
+  // One plug-in's sides, whatever the file: Alpha imports and exports, Beta only imports.
+  for (const auto& descriptor : factory.scenePlugins()) {
+    const std::string_view name = base::text(descriptor->name);
+    base::AttribMap imports, exports;
+    EXPECT_TRUE(factory.getPluginParameters(*descriptor, true, imports)) << name;
+    EXPECT_EQ(*imports.findAttribute<base::string>(base::intern("parametersFrom")), name);
+    EXPECT_EQ(factory.getPluginParameters(*descriptor, false, exports), name == "AlphaImporter") << name;
+  }
+  EXPECT_TRUE(factory.objects().empty());
+
   base::PluginFactory scene("scene");
   EXPECT_FALSE(factory.save(scene, "out.alpha", parameters));  // the test exporter wants objects
   scene.create(base::intern("record"));

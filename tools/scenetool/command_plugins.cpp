@@ -1,11 +1,14 @@
+#include "b_json.h"
 #include "b_path.h"
 #include "scene_factory.h"
+#include "scene_plugin.h"
 #include "scenetool_app.h"
 
 #include <fmt/format.h>
 #include <rapidjson/stringbuffer.h>
 #include <rapidjson/writer.h>
 
+#include <algorithm>
 #include <memory>
 #include <string_view>
 
@@ -21,7 +24,42 @@ void writeMember(rapidjson::Writer<rapidjson::StringBuffer>& writer, const char*
   writer.String(text.data(), static_cast<rapidjson::SizeType>(text.size()));
 }
 
-void printJson(const scene::SceneFactory& factory) {
+// Each parameter of one side of a plug-in: name, attribute type and default, in name order.
+struct Parameter {
+  base::string name, type, defaultJson, defaultText;
+};
+
+base::vector<Parameter> parametersOf(scene::SceneFactory& factory, scene::IScenePluginDesc& descriptor,
+                                     bool importers) {
+  base::AttribMap parameters;
+  base::vector<Parameter> result;
+  if (!factory.getPluginParameters(descriptor, importers, parameters)) return result;
+  for (const auto& [name, attribute] : parameters.members()) {
+    base::JsonWriter json;
+    attribute->writeValue(json);
+    result.push_back({base::string(base::text(name)), base::string(base::text(attribute->type())),
+                      base::string(json.text()), attribute->toString()});
+  }
+  std::sort(result.begin(), result.end(), [](const Parameter& a, const Parameter& b) { return a.name < b.name; });
+  return result;
+}
+
+void writeParameters(rapidjson::Writer<rapidjson::StringBuffer>& writer, const char* key,
+                     const base::vector<Parameter>& parameters) {
+  writer.Key(key);
+  writer.StartArray();
+  for (const Parameter& parameter : parameters) {
+    writer.StartObject();
+    writeMember(writer, "name", parameter.name);
+    writeMember(writer, "type", parameter.type);
+    writer.Key("default");
+    writer.RawValue(parameter.defaultJson.data(), parameter.defaultJson.size(), rapidjson::kObjectType);
+    writer.EndObject();
+  }
+  writer.EndArray();
+}
+
+void printJson(scene::SceneFactory& factory) {
   rapidjson::StringBuffer buffer;
   rapidjson::Writer<rapidjson::StringBuffer> writer(buffer);
   writer.StartObject();
@@ -34,6 +72,8 @@ void printJson(const scene::SceneFactory& factory) {
     writeMember(writer, "importerExtensions", descriptor->getImporterExtensions());
     writeMember(writer, "exporterExtensions", descriptor->getExporterExtensions());
     writeMember(writer, "library", factory.libraryOf(descriptor.get()));
+    writeParameters(writer, "importerParameters", parametersOf(factory, *descriptor, true));
+    writeParameters(writer, "exporterParameters", parametersOf(factory, *descriptor, false));
     writer.EndObject();
   }
   writer.EndArray();
@@ -41,7 +81,15 @@ void printJson(const scene::SceneFactory& factory) {
   fmt::print("{}\n", buffer.GetString());
 }
 
-void printText(const scene::SceneFactory& factory) {
+void printParameters(const char* side, const base::vector<Parameter>& parameters) {
+  if (parameters.empty()) return;
+  fmt::print("  {} parameters:\n", side);
+  for (const Parameter& parameter : parameters) {
+    fmt::print("    {} ({}, default {})\n", parameter.name, parameter.type, parameter.defaultText);
+  }
+}
+
+void printText(scene::SceneFactory& factory) {
   if (factory.scenePlugins().empty()) {
     fmt::print("no scene plug-ins in {}\n", base::getDirectory(base::getExecutablePath()));
     return;
@@ -51,6 +99,8 @@ void printText(const scene::SceneFactory& factory) {
     fmt::print("{} by {}: imports {}; exports {}; from {}\n", base::text(descriptor->name),
                descriptor->author.empty() ? "(unknown)" : descriptor->author, descriptor->getImporterExtensions(),
                exports.empty() ? "nothing" : exports, factory.libraryOf(descriptor.get()));
+    printParameters("importer", parametersOf(factory, *descriptor, true));
+    printParameters("exporter", parametersOf(factory, *descriptor, false));
   }
 }
 
