@@ -1,4 +1,5 @@
 #include "b_fs.h"
+#include "b_fs_gzip.h"
 #include "b_platform_fs.h"
 
 namespace base::fs {
@@ -19,6 +20,7 @@ struct FileSystems {
 
   FileSystems() {
     factory->registerDesc(platform::systemFileSystem());
+    factory->registerDesc(gzipFileSystem());
     factory->registerDesc(ref<IPluginDesc>(new MasterPluginDesc));
     master = ref<MasterFS>(static_cast<MasterFS*>(
         factory->create(intern("master"), PluginFactory::createOrNull | PluginFactory::createUnlisted).get()));

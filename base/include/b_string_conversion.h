@@ -19,6 +19,8 @@ namespace base {
 BASE1_API base::string toText(float value);
 /// The text of a double, by the rule of toText(float).
 BASE1_API base::string toText(double value);
+/// `text` with the ASCII letters A to Z made lower case; other bytes stay (UTF-8 is kept).
+BASE1_API base::string asciiLower(std::string_view text);
 
 /// Reads a float: an optional sign, integer digits, an optional '.' with fraction digits and
 /// an optional exponent ('e' or 'E', optional sign, digits), computed digit by digit in

@@ -12,7 +12,6 @@
 #endif
 
 #include <algorithm>
-#include <cctype>
 #include <memory>
 
 namespace base {
@@ -125,9 +124,7 @@ base::string readWholeFile(std::string_view path) {
 bool hasXmlExtension(std::string_view name) {
   const std::size_t dot = name.rfind('.');
   if (dot == std::string_view::npos || name.size() - dot != 4) return false;
-  base::string extension(name.substr(dot + 1));
-  for (char& c : extension) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
-  return extension == "xml";
+  return asciiLower(name.substr(dot + 1)) == "xml";
 }
 
 }  // namespace

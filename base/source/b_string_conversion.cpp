@@ -98,6 +98,14 @@ void realFromString(std::string_view text, T& value) {
 
 }  // namespace
 
+base::string asciiLower(std::string_view text) {
+  base::string result(text);
+  for (char& c : result) {
+    if (c >= 'A' && c <= 'Z') c = static_cast<char>(c - 'A' + 'a');
+  }
+  return result;
+}
+
 base::string toText(float value) { return realText(value); }
 base::string toText(double value) { return realText(value); }
 

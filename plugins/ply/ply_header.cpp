@@ -1,11 +1,11 @@
 #include "ply_parser.h"
 
 #include "b_log.h"
+#include "b_string_conversion.h"
 #include "ply_text.h"
 
 #include <algorithm>
 #include <bit>
-#include <cctype>
 #include <optional>
 
 namespace ply {
@@ -20,12 +20,6 @@ bool fail(fmt::format_string<Args...> format, Args&&... args) {
 bool fail(std::string_view message) {
   base::log().message(base::logScene, base::logError, message);
   return false;
-}
-
-std::string lowerCase(std::string_view word) {
-  std::string lower(word);
-  for (char& c : lower) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
-  return lower;
 }
 
 // The tag's halves: low the data's byte order, high the machine's (0 little, 1 big).
@@ -89,7 +83,7 @@ bool lineEnded(const HeaderWords& words, std::string_view what) {
 }
 
 bool parseFormatLine(Header& header, HeaderWords& words, base::Stream& stream) {
-  if (lowerCase(words.keyword()) != "ply") return fail("Invalid .ply file: Magic number 'ply' is not there.");
+  if (base::asciiLower(words.keyword()) != "ply") return fail("Invalid .ply file: Magic number 'ply' is not there.");
   if (words.keyword() != "format") return fail("Invalid .ply file: Missing format specification");
   const std::optional<std::string_view> format = words.argument();
   if (!format) return lineEnded(words, "the format's encoding");

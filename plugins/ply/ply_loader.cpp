@@ -112,7 +112,14 @@ bool PLYImporter::importScene(base::PluginFactory& factory, std::string_view pat
   m_currentMesh = createRequired(factory, mesh_schema::typeName());
 
   Header header;
-  const ReadResult read = readFile(header, stream, *this);
+  ReadResult read;
+  try {
+    read = readFile(header, stream, *this);
+  } catch (...) {
+    // The data could not be read (damaged compressed data, say): the import fails whole.
+    factory.remove(m_currentMesh->index());
+    throw;
+  }
   finishElement();
   if (read == ReadResult::headerFailed) {
     // Nothing of a file whose header fails is imported: its empty mesh goes again.

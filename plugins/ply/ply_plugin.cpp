@@ -17,7 +17,7 @@ class PlyPluginDesc final : public scene::IScenePluginDesc {
   base::IPlugin* create(base::PluginFactory* factory, std::uint32_t index) override {
     return new PLYImporter(factory, this, index);
   }
-  base::string getImporterExtensions() const override { return "ply"; }
+  base::string getImporterExtensions() const override { return "ply;ply.gz"; }
   base::string getExporterExtensions() const override { return {}; }
 };
 

@@ -4,11 +4,11 @@
 #include "b_fs.h"
 #include "b_log.h"
 #include "b_path.h"
+#include "b_string_conversion.h"
 
 #include <fmt/format.h>
 
 #include <algorithm>
-#include <cctype>
 #include <exception>
 #include <set>
 
@@ -19,12 +19,6 @@ std::string_view trimmed(std::string_view text) {
   const std::size_t first = text.find_first_not_of(" \t");
   if (first == std::string_view::npos) return {};
   return text.substr(first, text.find_last_not_of(" \t") - first + 1);
-}
-
-base::string lowerCase(std::string_view text) {
-  base::string result(text);
-  for (char& c : result) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
-  return result;
 }
 
 // Calls `each` with every non-empty token of a `;`-separated list, trimmed.
@@ -201,7 +195,7 @@ base::ref<base::IPlugin> SceneFactory::createImporter(std::string_view path, con
                                                       std::string_view emptyMessage, std::uint32_t& index) {
   base::string previous;
   for (const bool second : {true, false}) {
-    const base::string extension = lowerCase(base::getExtension(path, second));
+    const base::string extension = base::asciiLower(base::getExtension(path, second));
     if (extension.empty()) base::raise<base::exception>(function, emptyMessage);
     if (extension == previous) return nullptr;
     if (base::ref<base::IPlugin> object = createFor(extension, true, index)) return object;
@@ -242,7 +236,7 @@ bool SceneFactory::getPluginParameters(IScenePluginDesc& descriptor, bool import
 }
 
 bool SceneFactory::getExporterParameters(std::string_view path, base::AttribMap& parameters) {
-  const base::string extension = lowerCase(base::getExtension(path, true));
+  const base::string extension = base::asciiLower(base::getExtension(path, true));
   if (extension.empty()) {
     base::raise<base::exception>("scene::SceneFactory::getExporterParameters",
                                  "mesh factory: Can't save meshes without an extension!");
@@ -269,7 +263,7 @@ bool SceneFactory::load(base::PluginFactory& scene, std::string_view path, const
 }
 
 bool SceneFactory::save(base::PluginFactory& scene, std::string_view path, const base::AttribMap& parameters) {
-  const base::string extension = lowerCase(base::getExtension(path, true));
+  const base::string extension = base::asciiLower(base::getExtension(path, true));
   if (extension.empty()) {
     base::raise<base::exception>("scene::SceneFactory::save",
                                  "mesh factory: Can't save meshes without a provided format!");

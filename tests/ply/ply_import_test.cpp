@@ -21,36 +21,16 @@ using scene::meshColorSet_schema;
 using scene::meshPrimitive_schema;
 using scene::meshUVSet_schema;
 using scene::principalMaterial_schema;
+using testing_support::arraySize;
+using testing_support::asciiHeader;
 using testing_support::ImportedScene;
 using testing_support::importFile;
+using testing_support::importText;
+using testing_support::list;
 using testing_support::LogCapture;
+using testing_support::setList;
 using testing_support::TemporaryFile;
 using Vec3 = base::base_vec3<float>;
-
-const std::string asciiHeader = "ply\nformat ascii 1.0\n";
-
-ImportedScene importText(const std::string& text, bool plans = true) {
-  const TemporaryFile file("test.ply", text);
-  return importFile(file.path(), plans);
-}
-
-template <class T>
-const base::vector<T>& list(const base::AttribMap& map, base::name_id name) {
-  const base::vector<T>* found = map.findVecAttribute<T>(name);
-  static const base::vector<T> none;
-  return found ? *found : none;
-}
-
-template <class T>
-const base::vector<T>& setList(const base::AttribMap& mesh, base::name_id sets, std::uint32_t index,
-                               base::name_id name) {
-  return list<T>(*scene::mapAt(*scene::findArrayMember(mesh, sets), index), name);
-}
-
-std::size_t arraySize(const base::AttribMap& map, base::name_id name) {
-  const base::AttribArray* array = scene::findArrayMember(map, name);
-  return array ? array->size() : 0;
-}
 
 // The mesh's plain indices.
 base::vector<std::uint32_t> decodedIndices(base::AttribMap& mesh) {
@@ -331,7 +311,7 @@ TEST(PlyImport, ASceneThatCannotMakeTheNeededTypesFailsClearly) {
 TEST(PlyImport, TheImporterObject) {
   scene::SceneFactory& factory = testing_support::pluginFactory();
   ASSERT_EQ(factory.scenePlugins().size(), 1u);
-  EXPECT_EQ(factory.scenePlugins()[0]->getImporterExtensions(), "ply");
+  EXPECT_EQ(factory.scenePlugins()[0]->getImporterExtensions(), "ply;ply.gz");
   EXPECT_EQ(factory.scenePlugins()[0]->getExporterExtensions(), "");
   EXPECT_EQ(factory.scenePlugins()[0]->author, "Tarn Velisk");
   const base::ref<base::IPlugin> importer = factory.create(base::intern("PlyImporter"));

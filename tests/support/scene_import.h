@@ -15,6 +15,8 @@
 #include <filesystem>
 #include <fstream>
 #include <string>
+#include <utility>
+#include <vector>
 
 namespace testing_support {
 
@@ -60,10 +62,15 @@ struct ImportedScene {
   }
 };
 
-/// Imports `path`; with `plans` false the reader delivers every value one by one.
-inline ImportedScene importFile(const std::string& path, bool plans = true) {
+/// Boolean importer parameters by name.
+using Switches = std::vector<std::pair<std::string, bool>>;
+
+/// Imports `path` with the importer's `switches`; with `plans` false the reader delivers
+/// every value one by one.
+inline ImportedScene importFile(const std::string& path, bool plans = true, const Switches& switches = {}) {
   ImportedScene imported;
   base::AttribMap parameters;
+  for (const auto& [name, on] : switches) parameters.attribute(base::intern(name), on);
   if (!plans) parameters.attribute(base::intern("plyColumnPlans"), false);
   imported.loaded = pluginFactory().load(*imported.scene, path, parameters);
   return imported;
@@ -85,5 +92,33 @@ class TemporaryFile {
   std::filesystem::path m_folder;
   std::string m_path;
 };
+
+inline const std::string asciiHeader = "ply\nformat ascii 1.0\n";
+
+/// Imports `text` from a temporary "test.ply".
+inline ImportedScene importText(const std::string& text, bool plans = true, const Switches& switches = {}) {
+  const TemporaryFile file("test.ply", text);
+  return importFile(file.path(), plans, switches);
+}
+
+/// The list `name` of `map`; empty when there is none.
+template <class T>
+const base::vector<T>& list(const base::AttribMap& map, base::name_id name) {
+  const base::vector<T>* found = map.findVecAttribute<T>(name);
+  static const base::vector<T> none;
+  return found ? *found : none;
+}
+
+/// The list `name` of entry `index` of the mesh's set array `sets` (uvSets, colorSets).
+template <class T>
+const base::vector<T>& setList(const base::AttribMap& mesh, base::name_id sets, std::uint32_t index,
+                               base::name_id name) {
+  return list<T>(*scene::mapAt(*scene::findArrayMember(mesh, sets), index), name);
+}
+
+inline std::size_t arraySize(const base::AttribMap& map, base::name_id name) {
+  const base::AttribArray* array = scene::findArrayMember(map, name);
+  return array ? array->size() : 0;
+}
 
 }  // namespace testing_support

@@ -43,12 +43,12 @@ int readObjectList(const std::string& path, base::PluginFactory& scene) {
   try {
     scene.read(stream);
   } catch (const base::exception& failure) {
-    printError(fmt::format("{}: {}", path, failure.what()));
+    printFileError(path, failure.what());
     return exitFailed;
   }
   // A bad type record ends the read early with an error: the file is damaged.
   if (const auto cause = relay.takeCause()) {
-    printError(fmt::format("{}: {}", path, *cause));
+    printFileError(path, *cause);
     return exitFailed;
   }
   return exitOk;
@@ -71,7 +71,7 @@ int importScene(scene::SceneFactory& factory, const std::string& path, const std
     printError(fmt::format("{}: no such file", path));
   } catch (const base::exception& error) {
     const auto cause = relay.takeCause();
-    printError(fmt::format("{}: {}", path, cause ? *cause : error.what()));
+    printFileError(path, cause ? *cause : error.what());
   }
   return exitFailed;
 }

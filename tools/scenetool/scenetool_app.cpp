@@ -73,6 +73,11 @@ int runCommand(const Command& command) {
 
 void printError(const std::string& text) { fmt::print(stderr, "scenetool: error: {}\n", text); }
 
+void printFileError(const std::string& path, std::string_view text) {
+  if (text.starts_with(path + ": ")) return printError(std::string(text));
+  printError(fmt::format("{}: {}", path, text));
+}
+
 int run(int argc, const char* const* argv) {
   CLI::App app(description, "scenetool");
   Options options;

@@ -4,6 +4,7 @@
 
 #include <functional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace scenetool {
@@ -43,5 +44,8 @@ int run(int argc, const char* const* argv);
 
 /// Prints "scenetool: error: <text>" on standard error.
 void printError(const std::string& text);
+/// Prints "scenetool: error: <path>: <text>"; a text that names the file at its start
+/// already (a decompressing stream's error, say) is printed as it is.
+void printFileError(const std::string& path, std::string_view text);
 
 }  // namespace scenetool

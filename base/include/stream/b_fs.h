@@ -157,7 +157,8 @@ class BASE1_API MasterFS : public IPlugin {
   bool isInArchive(std::string_view path) override;
   bool fileExists(std::string_view path) override;
   bool dirExists(std::string_view path) override;
-  /// The first file system that has the file opens it. When none has it, the last
+  /// The first file system that has the file opens it; for reading, the file systems that
+  /// list the file's extension are asked first. When none has it, the last
   /// base::wrong_password is thrown, else the first fs::file_not_found.
   Stream open(std::string_view path, std::uint32_t mode) override;
   /// The listings of all attached file systems, one after the other.

@@ -187,6 +187,10 @@ BASE1_API Stream bufReadStream(const Stream& source, std::int64_t length, std::u
 /// A write buffer of `bufferSize` bytes over `destination`; pending bytes go out on flush
 /// and on close.
 BASE1_API Stream bufWriteStream(const Stream& destination, std::uint32_t bufferSize, std::string_view name = {});
+/// The decompressed data of gzip (concatenated members too) or zlib data read from `source`.
+/// It has no size and no positions; data that ends early or does not decode throws
+/// base::zlib_exception naming the stream.
+BASE1_API Stream inflateStream(const Stream& source, std::string_view name = {});
 /// A read buffer that delivers one byte per read and can step back by one byte.
 BASE1_API Stream charStream(const Stream& source, std::uint32_t bufferSize, std::string_view name = {});
 

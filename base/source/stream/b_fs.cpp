@@ -5,6 +5,7 @@
 #include "b_log.h"
 #include "b_path.h"
 #include "b_stack_walker.h"
+#include "b_string_conversion.h"
 
 #include <fmt/format.h>
 
@@ -24,6 +25,20 @@ bool listsExtension(std::string_view list, std::string_view extension) {
     start = end + 1;
   }
   return false;
+}
+
+// The order in which open tries the file systems: for reading, those that list the file's
+// extension come first ("scan.ply.gz" is the gzip file system's before it is the system's
+// raw bytes), then the others in attach order.
+base::vector<ref<IPlugin>> readingOrder(const base::vector<ref<IPlugin>>& plugins, std::uint32_t mode,
+                                        std::string_view extension) {
+  base::vector<ref<IPlugin>> order = plugins;
+  if (!(mode & openWrite) && !extension.empty()) {
+    std::stable_partition(order.begin(), order.end(), [extension](const ref<IPlugin>& plugin) {
+      return listsExtension(plugin->getDesc()->extensions, extension);
+    });
+  }
+  return order;
 }
 
 // Runs `operation` on the first file system with `capability` that does it without an
@@ -152,7 +167,7 @@ Stream MasterFS::open(std::string_view path, std::uint32_t mode) {
   const NoStackCapture noCapture;
   std::exception_ptr notFound;
   std::exception_ptr wrongPassword;
-  for (const ref<IPlugin>& plugin : m_plugins) {
+  for (const ref<IPlugin>& plugin : readingOrder(m_plugins, mode, asciiLower(getExtension(expanded)))) {
     try {
       return plugin->open(expanded, mode);
     } catch (const file_not_found&) {

@@ -156,7 +156,7 @@ TEST_F(MasterTest, AWrongPasswordWinsOverNotFoundAndTheLastOneIsKept) {
   master->attachFS("remote");
   fs("gzip").wrongPassword = true;
   fs("remote").wrongPassword = true;
-  const auto error = thrown<base::wrong_password>([&] { master->open("x.zip", base::fs::openForReading); });
+  const auto error = thrown<base::wrong_password>([&] { master->open("x.ply", base::fs::openForReading); });
   ASSERT_TRUE(error);
   EXPECT_STREQ(error->what(), "remote");
   EXPECT_TRUE(base::StackWalker::threadCapture());
@@ -181,6 +181,23 @@ TEST_F(MasterTest, WritingByExtensionGoesToTheFileSystemThatListsIt) {
   fs("system").files["/out.zip/x.j"] = "";
   master->open("/out.zip/x.j", base::fs::openWrite | base::fs::openByExtension);
   EXPECT_EQ(fs("system").opened.size(), 1u);
+}
+
+TEST_F(MasterTest, ReadingAsksTheFileSystemsThatListTheExtensionFirst) {
+  fs("gzip").files["scan.ply.GZ"] = "inflated";
+  fs("system").files["scan.ply.GZ"] = "raw";
+  char text[8];
+  ASSERT_EQ(master->open("scan.ply.GZ", base::fs::openForReading).read(text, 8), 8u);
+  EXPECT_EQ(std::string(text, 8), "inflated");
+  EXPECT_TRUE(fs("system").opened.empty());
+  // One that does not have the file leaves it to the others, in attach order.
+  fs("system").files["other.gz"] = "raw";
+  ASSERT_EQ(master->open("other.gz", base::fs::openForReading).read(text, 3), 3u);
+  EXPECT_EQ(std::string(text, 3), "raw");
+  EXPECT_EQ(fs("gzip").opened, (std::vector<std::string>{"scan.ply.GZ", "other.gz"}));
+  // Writing keeps the attach order.
+  master->open("scan.ply.GZ", base::fs::openWrite);
+  EXPECT_EQ(fs("system").opened, (std::vector<std::string>{"other.gz", "scan.ply.GZ"}));
 }
 
 TEST_F(MasterTest, ExistenceIsAnyFileSystemsAnswerAfterAliasExpansion) {
