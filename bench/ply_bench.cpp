@@ -94,7 +94,7 @@ class PlanReceiver {
     const std::uint32_t normals = addArray(plan, m_arrays.normals, 3);
     const std::uint32_t colors = addArray(plan, m_arrays.colors, colorWidth);
     const std::uint32_t uvs = addArray(plan, m_arrays.uvs, 2);
-    base::append(plan.sinks, ply::IndexSink{&m_arrays.indices, ply::IndexSink::noRangeCheck, &m_arrays.counts});
+    base::append(plan.sinks, ply::ListSink{&m_arrays.indices, ply::ListSink::noRangeCheck, &m_arrays.counts});
     for (const ply::Property& property : element.properties) {
       ply::PropertyPlan target{ply::PropertyPlan::Kind::scalar};
       const auto semantic = static_cast<std::uint32_t>(property.semantic);

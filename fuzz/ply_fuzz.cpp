@@ -105,7 +105,7 @@ struct Planned : Delivered {
                                                  return reinterpret_cast<std::byte*>(target.scalars.data());
                                                },
                                                4 * width});
-    base::append(plan.sinks, ply::IndexSink{&target.indices, ply::IndexSink::noRangeCheck, &target.counts, nullptr,
+    base::append(plan.sinks, ply::ListSink{&target.indices, ply::ListSink::noRangeCheck, &target.counts, nullptr,
                                             longestPlannedList});
     for (std::uint32_t p = 0; p < width; ++p) base::append(plan.properties, planOf(element, p, target, plan));
     return true;

@@ -166,8 +166,7 @@ class AsciiBody {
     m_counts.clear();
     for (std::size_t p = 0; p < element.properties.size(); ++p) {
       const PropertyPlan& plan = m_plan.properties[p];
-      const Conversion conversion = plan.kind == PropertyPlan::Kind::indices ? Conversion::toIndex : plan.conversion;
-      base::append(m_store, WordStore(element.properties[p].type, conversion));
+      base::append(m_store, WordStore(element.properties[p].type, plan.storedAs()));
       base::append(m_counts, WordStore(element.properties[p].countType, Conversion::toIndex));
     }
     PlanTargets targets(m_plan, element.count, m_window.remaining().has_value());
@@ -217,9 +216,9 @@ class AsciiBody {
     if (const Status status = storeNext(m_counts[p], reinterpret_cast<std::byte*>(&count)); status != Status::ok) {
       return status;
     }
-    const bool indices = plan.kind == PropertyPlan::Kind::indices && count <= m_plan.sinks[plan.sink].maxLength;
+    const bool toSink = plan.toSink() && count <= m_plan.sinks[plan.sink].maxLength;
     const bool values = plan.kind == PropertyPlan::Kind::valueList && count == plan.length;
-    if (!indices && !values) {
+    if (!toSink && !values) {
       const bool deliver = plan.kind != PropertyPlan::Kind::skip;
       if (const Status status = readList(property, count, deliver); status != Status::ok) return status;
       if (deliver) receiver.plyProperty(element, property, m_values);
@@ -236,13 +235,13 @@ class AsciiBody {
         return status;
       }
     }
-    if (indices) {
-      const IndexSink& sink = m_plan.sinks[plan.sink];
+    if (toSink) {
+      const ListSink& sink = m_plan.sinks[plan.sink];
       // An ASCII item takes at least two bytes: a digit and a blank.
-      if (sink.indices->capacity() < sink.indices->size() + count) {
+      if (sink.items->capacity() < sink.items->size() + count) {
         reserveAhead(sink, m_window.remaining(), std::uint64_t(m_count) - i, count, 2);
       }
-      storeIndexList(sink, m_items.data(), count, m_report);
+      storeList(sink, m_items.data(), count, m_report);
     } else {
       std::memcpy(targets.at(plan.array, i, plan.offset), m_items.data(), std::size_t(count) * 4);
     }
@@ -256,7 +255,7 @@ class AsciiBody {
   ElementPlan m_plan;
   base::vector<WordStore> m_store;
   base::vector<WordStore> m_counts;
-  std::uint32_t m_count = 0;  ///< instances of the planned element  ///< a list's count; unused for scalars
+  std::uint32_t m_count = 0;  ///< instances of the planned element
   base::vector<std::uint32_t> m_items;
   BadIndexReport m_report;
 };

@@ -166,9 +166,8 @@ class BinaryBody {
     for (std::size_t p = 0; p < element.properties.size(); ++p) {
       const Property& property = element.properties[p];
       const PropertyPlan& plan = m_plan.properties[p];
-      const Conversion conversion = plan.kind == PropertyPlan::Kind::indices ? Conversion::toIndex : plan.conversion;
       base::append(m_steps, Step{&property, &plan, dataTypeSize(property.type),
-                                 columnFunction<Swap>(property.type, conversion)});
+                                 columnFunction<Swap>(property.type, plan.storedAs())});
     }
   }
 
@@ -179,10 +178,10 @@ class BinaryBody {
     PlanTargets targets(m_plan, element.count, m_window.remaining().has_value());
     const bool delivers = m_plan.delivers();
     if (layout.recordSize > 0) return readPlannedRecords(element, layout, targets, delivers, receiver);
-    // Runs of equal lists go in bulk when one list is all the element has besides scalars
-    // that the plan stores or skips.
-    const bool uniform = std::count_if(element.properties.begin(), element.properties.end(),
-                                       [](const Property& property) { return property.isList; }) == 1 &&
+    // Runs of equal lists go in bulk when the plan stores or skips everything.
+    m_runCounts.assign(m_steps.size(), 0);
+    const bool uniform = std::any_of(element.properties.begin(), element.properties.end(),
+                                     [](const Property& property) { return property.isList; }) &&
                          std::none_of(m_plan.properties.begin(), m_plan.properties.end(), [](const PropertyPlan& plan) {
                            return plan.kind == PropertyPlan::Kind::deliver;
                          });
@@ -246,8 +245,9 @@ class BinaryBody {
     switch (step.plan->kind) {
       case PropertyPlan::Kind::skip:
         return true;
-      case PropertyPlan::Kind::indices: {
-        const IndexSink& sink = m_plan.sinks[step.plan->sink];
+      case PropertyPlan::Kind::indices:
+      case PropertyPlan::Kind::itemList: {
+        const ListSink& sink = m_plan.sinks[step.plan->sink];
         return !sink.runCounts && count <= sink.maxLength;
       }
       case PropertyPlan::Kind::valueList:
@@ -257,29 +257,42 @@ class BinaryBody {
     }
   }
 
-  // An element with one list whose instances all have the same length (a triangle mesh's
-  // faces) is a run of fixed-size records: this reads as many as the window holds at once.
-  // 0 when the next instance does not start such a run; it then goes the general way.
+  // An element whose lists have the same lengths from instance to instance (a triangle mesh's
+  // faces, with their texture coordinates) is a run of fixed-size records: this reads as many
+  // as the window holds at once. 0 when the next instance does not start such a run; it then
+  // goes the general way.
   std::uint64_t uniformRun(const Element& element, std::uint64_t first, PlanTargets& targets) {
-    std::uint32_t before = 0;
-    std::size_t list = 0;
-    while (!element.properties[list].isList) before += m_steps[list++].size;
-    const Property& property = element.properties[list];
-    const std::uint32_t countSize = dataTypeSize(property.countType);
-    const std::uint8_t* head = m_window.require(before + countSize);
-    if (!head) return 0;
-    const std::uint32_t count = listCount(decodeBinary<Swap>(head + before, property.countType), property.countType);
-    if (!bulkList(m_steps[list], count)) return 0;
-    std::uint64_t size = before + countSize + std::uint64_t(count) * m_steps[list].size;
-    for (std::size_t p = list + 1; p < m_steps.size(); ++p) size += m_steps[p].size;
-    if (size > m_window.capacity()) return 0;
-    const std::uint8_t* records = m_window.require(size);
+    std::uint64_t size = 0;
+    for (const Step& step : m_steps) {
+      if (!step.property->isList) {
+        size += step.size;
+        continue;
+      }
+      const std::uint32_t countSize = dataTypeSize(step.property->countType);
+      const std::uint8_t* head = size + countSize <= m_window.capacity() ? m_window.require(size + countSize) : nullptr;
+      if (!head) return 0;
+      const std::uint32_t count =
+          listCount(decodeBinary<Swap>(head + size, step.property->countType), step.property->countType);
+      if (!bulkList(step, count)) return 0;
+      m_runCounts[&step - m_steps.data()] = count;
+      size += countSize + std::uint64_t(count) * step.size;
+    }
+    const std::uint8_t* records = size <= m_window.capacity() ? m_window.require(size) : nullptr;
     if (!records) return 0;
-    const std::uint64_t limit =
+    std::uint64_t run =
         std::min<std::uint64_t>(element.count - first, static_cast<std::uint64_t>(m_window.end() - records) / size);
-    const std::uint64_t run = equalCounts(records + before, size, limit, countSize);
+    std::uint64_t offset = 0;
+    for (std::size_t p = 0; p < m_steps.size(); ++p) {
+      if (!m_steps[p].property->isList) {
+        offset += m_steps[p].size;
+        continue;
+      }
+      const std::uint32_t countSize = dataTypeSize(m_steps[p].property->countType);
+      run = equalCounts(records + offset, size, run, countSize);
+      offset += countSize + std::uint64_t(m_runCounts[p]) * m_steps[p].size;
+    }
     targets.reach(first + run);
-    storeUniformRun(records, size, first, run, list, count, targets);
+    storeUniformRun(records, size, first, run, targets);
     m_window.advance(run * size);
     return run;
   }
@@ -305,15 +318,15 @@ class BinaryBody {
   }
 
   void storeUniformRun(const std::uint8_t* records, std::uint64_t size, std::uint64_t first, std::uint64_t run,
-                       std::size_t list, std::uint32_t count, PlanTargets& targets) {
+                       PlanTargets& targets) {
     std::uint64_t offset = 0;
     for (std::size_t p = 0; p < m_steps.size(); ++p) {
       const Step& step = m_steps[p];
       const PropertyPlan& plan = *step.plan;
-      if (p == list) {
+      if (step.property->isList) {
         offset += dataTypeSize(step.property->countType);
-        storeListColumns(records + offset, size, first, run, step, count, targets);
-        offset += std::uint64_t(count) * step.size;
+        storeListColumns(records + offset, size, first, run, step, m_runCounts[p], targets);
+        offset += std::uint64_t(m_runCounts[p]) * step.size;
         continue;
       }
       if (plan.kind == PropertyPlan::Kind::scalar) {
@@ -332,9 +345,9 @@ class BinaryBody {
         step.convert(items + k * step.size, size, run, targets.at(plan.array, first, plan.offset + 4 * k),
                      targets.stride(plan.array));
       }
-    } else if (plan.kind == PropertyPlan::Kind::indices) {
-      const IndexSink& sink = m_plan.sinks[plan.sink];
-      base::vector<std::uint32_t>& indices = *sink.indices;
+    } else if (plan.toSink()) {
+      const ListSink& sink = m_plan.sinks[plan.sink];
+      base::vector<std::uint32_t>& indices = *sink.items;
       const std::size_t start = indices.size();
       if (indices.capacity() < start + run * count) {
         reserveAhead(sink, m_window.remaining(), m_elementCount - first, count, step.size);
@@ -379,14 +392,15 @@ class BinaryBody {
         return true;
       }
       case PropertyPlan::Kind::indices:
+      case PropertyPlan::Kind::itemList:
       case PropertyPlan::Kind::valueList:
         break;
     }
     std::uint32_t count = 0;
     if (!readCount(*step.property, count)) return false;
-    if (plan.kind == PropertyPlan::Kind::indices && count <= m_plan.sinks[plan.sink].maxLength) {
+    if (plan.toSink() && count <= m_plan.sinks[plan.sink].maxLength) {
       if (!readIndexItems(step, count)) return false;
-      storeIndexList(m_plan.sinks[plan.sink], m_items.data(), count, m_report);
+      storeList(m_plan.sinks[plan.sink], m_items.data(), count, m_report);
       return true;
     }
     if (plan.kind == PropertyPlan::Kind::valueList && count == plan.length &&
@@ -417,6 +431,7 @@ class BinaryBody {
   ElementPlan m_plan;
   base::vector<Step> m_steps;
   base::vector<std::uint32_t> m_items;
+  base::vector<std::uint32_t> m_runCounts;  ///< each list's length in the current uniform run
   BadIndexReport m_report;
   std::uint64_t m_elementCount = 0;
 };

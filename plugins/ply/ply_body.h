@@ -73,7 +73,7 @@ bool askPlan(R& receiver, const Element& element, ElementPlan& plan) {
   if constexpr (requires { receiver.plyPlan(element, plan); }) {
     plan.clear();
     if (!receiver.plyPlan(element, plan)) return false;
-    if (plan.properties.size() != element.properties.size() || !plan.fits()) {
+    if (!plan.fits(element)) {
       base::raise<base::invalid_argument>("ply::readFile", "plan");
     }
     return true;

@@ -61,10 +61,12 @@ using Held = std::conditional_t<std::is_floating_point_v<NativeType<T>>, NativeT
                                 std::conditional_t<std::is_signed_v<NativeType<T>>, std::int32_t, std::uint32_t>>;
 
 /// What Conversion C stores for a held value of type T: the same numbers as
-/// Value::convertTo and ply::toFP give.
+/// Value::convertTo and ply::toFP give, or the value in its own type.
 template <DataType T, Conversion C>
 inline auto convertHeld(Held<T> value) {
-  if constexpr (C == Conversion::toIndex) {
+  if constexpr (C == Conversion::native) {
+    return static_cast<NativeType<T>>(value);
+  } else if constexpr (C == Conversion::toIndex) {
     if constexpr (std::is_floating_point_v<Held<T>>) {
       return static_cast<std::uint32_t>(truncateToInteger(static_cast<double>(value)));
     } else {
@@ -92,7 +94,8 @@ void convertColumn(const std::uint8_t* source, std::size_t sourceStride, std::si
 }
 
 /// `make.template operator()<T, C>()` for the type and conversion given at run time: the one
-/// place where a choice per property turns into a function made for it. Null for `none`.
+/// place where a choice per property turns into a function made for it. A value-initialised
+/// result (null) for `none`.
 template <Conversion C, class Make>
 auto forType(DataType type, Make make) -> decltype(make.template operator()<DataType::int8, C>()) {
   switch (type) {
@@ -115,7 +118,7 @@ auto forType(DataType type, Make make) -> decltype(make.template operator()<Data
     case DataType::none:
       break;
   }
-  return nullptr;
+  return {};
 }
 
 template <class Make>
@@ -125,6 +128,8 @@ auto forTypeAndConversion(DataType type, Conversion conversion, Make make) {
       return forType<Conversion::toFloat>(type, make);
     case Conversion::normalised:
       return forType<Conversion::normalised>(type, make);
+    case Conversion::native:
+      return forType<Conversion::native>(type, make);
     case Conversion::toIndex:
       break;
   }
@@ -166,18 +171,18 @@ class PlanTargets {
 };
 
 /// Replaces each index not below `vertexCount` by 0 and reports it; no check for
-/// IndexSink::noRangeCheck.
+/// ListSink::noRangeCheck.
 void checkIndices(std::uint32_t* indices, std::size_t count, std::uint32_t vertexCount, BadIndexReport& report);
 
 /// Where the stream's size shows how much data is left (`bytesLeft`), gives `sink` room at
 /// once for the rest of an element whose lists have `count` items of at least `itemBytes`
 /// bytes each, so that its lists are not copied over and over as they grow. The data left
 /// bounds the room, whatever the counts say.
-void reserveAhead(const IndexSink& sink, std::optional<std::uint64_t> bytesLeft, std::uint64_t instancesLeft,
+void reserveAhead(const ListSink& sink, std::optional<std::uint64_t> bytesLeft, std::uint64_t instancesLeft,
                   std::uint32_t count, std::uint32_t itemBytes);
 
-/// Stores one complete index list into `sink`: checked, split at restart markers for strips,
+/// Stores one complete list into `sink`: checked, split at restart markers for strips,
 /// with its count.
-void storeIndexList(const IndexSink& sink, const std::uint32_t* items, std::size_t count, BadIndexReport& report);
+void storeList(const ListSink& sink, const std::uint32_t* items, std::size_t count, BadIndexReport& report);
 
 }  // namespace ply::detail

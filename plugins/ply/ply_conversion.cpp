@@ -52,16 +52,6 @@ bool colourChannel(PropertySemantic s, std::uint32_t& family, std::uint32_t& cha
   return false;
 }
 
-// Other tools name texture coordinates texture_u/texture_v or texture_s/texture_t; they fill
-// a UV set like u and v. The header keeps them as unknown names: only the import reads them
-// as coordinates.
-PropertySemantic importedSemantic(const Property& property) {
-  if (property.semantic != PropertySemantic::unknown) return property.semantic;
-  if (property.name == "texture_u" || property.name == "texture_s") return PropertySemantic::u;
-  if (property.name == "texture_v" || property.name == "texture_t") return PropertySemantic::v;
-  return PropertySemantic::unknown;
-}
-
 std::size_t countOf(const Element& element, bool (*test)(PropertySemantic)) {
   return static_cast<std::size_t>(std::count_if(element.properties.begin(), element.properties.end(),
                                                 [test](const Property& p) { return test(importedSemantic(p)); }));
@@ -105,14 +95,11 @@ float converted(const Value& value, const Property& property, Conversion convers
 
 }  // namespace
 
-template <class T>
-std::uint32_t PLYImporter::addTarget(base::vector<T>& list) {
-  m_targets.push_back({[&list](std::size_t records) {
-                         if (records > list.size()) list.resize(records);
-                         return reinterpret_cast<std::byte*>(list.data());
-                       },
-                       [&list] { return list.size(); }, sizeof(T)});
-  return static_cast<std::uint32_t>(m_targets.size() - 1);
+PropertySemantic importedSemantic(const Property& property) {
+  if (property.semantic != PropertySemantic::unknown) return property.semantic;
+  if (property.name == "texture_u" || property.name == "texture_s") return PropertySemantic::u;
+  if (property.name == "texture_v" || property.name == "texture_t") return PropertySemantic::v;
+  return PropertySemantic::unknown;
 }
 
 bool PLYImporter::plyElement(const Element& element) {
@@ -139,6 +126,7 @@ bool PLYImporter::plyElement(const Element& element) {
 void PLYImporter::finishElement() {
   if (!m_element) return;
   m_badIndices.finish(*m_element);
+  finishFaceData();
   if (m_primitive) {
     m_primitive->attribute<std::uint32_t>(meshPrimitive_schema::indexCount(),
                                           static_cast<std::uint32_t>(m_indicesList->size()) - m_primitiveStart);
@@ -210,7 +198,10 @@ bool PLYImporter::prepareVertices(const Element& element) {
   if (has(element, PropertySemantic::materialIndex)) wanted = true;
   routeVertexProperties(element, positions ? addTarget(*positions) : noTarget, normals ? addTarget(*normals) : noTarget,
                         uvTargets, colourTargets, floatTargets);
-  return wanted;
+  prepareCustomProperties(element);
+  return wanted || std::any_of(m_routes.begin(), m_routes.end(), [](const Route& route) {
+           return route.kind == Route::Kind::customList || route.conversion == Conversion::native;
+         });
 }
 
 void PLYImporter::routeVertexProperties(const Element& element, std::uint32_t positions, std::uint32_t normals,
@@ -287,9 +278,6 @@ std::size_t PLYImporter::colourGroup(const base::vector<std::uint32_t>& groupFam
 
 bool PLYImporter::prepareIndices(const Element& element) {
   const bool faces = element.semantic == ElementSemantic::face;
-  if (faces && has(element, PropertySemantic::red)) {
-    base::log().message(base::logScene, base::logWarning, "Per face colors are not supported, will be ignored!");
-  }
   if (!has(element, PropertySemantic::vertexIndex)) return false;
   // Every index element appends to one shared list; its primitive names its own range.
   m_indicesList = &m_currentMesh->attribute<base::vector<std::uint32_t>>(mesh_schema::indices());
@@ -298,8 +286,8 @@ bool PLYImporter::prepareIndices(const Element& element) {
   m_primitive->attribute<std::uint32_t>(meshPrimitive_schema::indexStart(), m_primitiveStart);
   m_vcountsList = nullptr;
   m_ecountsList = nullptr;
-  m_sink = IndexSink{};
-  m_sink.indices = m_indicesList;
+  m_sink = ListSink{};
+  m_sink.items = m_indicesList;
   if (m_positionsList) m_sink.vertexCount = static_cast<std::uint32_t>(m_positionsList->size());
   if (element.semantic == ElementSemantic::tristrips) {
     m_ecountsList = &m_primitive->attribute<base::vector<std::uint32_t>>(meshPrimitive_schema::ecounts(),
@@ -318,6 +306,10 @@ bool PLYImporter::prepareIndices(const Element& element) {
   for (std::size_t p = 0; p < element.properties.size(); ++p) {
     if (element.properties[p].semantic == PropertySemantic::vertexIndex) m_routes[p].kind = Route::Kind::indices;
   }
+  if (faces) {
+    prepareFaceData(element);
+    prepareCustomProperties(element);
+  }
   return true;
 }
 
@@ -329,6 +321,8 @@ bool PLYImporter::plyPlan(const Element& element, ElementPlan& plan) {
   if (!m_columnPlans || element.semantic == ElementSemantic::material) return false;
   for (const Target& target : m_targets) plan.arrays.push_back({target.resize, target.stride});
   if (m_primitive) plan.sinks.push_back(m_sink);
+  const auto itemSink = static_cast<std::uint32_t>(plan.sinks.size());
+  if (m_faceUVSet) plan.sinks.push_back(m_itemSink);
   for (std::size_t p = 0; p < element.properties.size(); ++p) {
     const Route& route = m_routes[p];
     PropertyPlan property;
@@ -343,6 +337,11 @@ bool PLYImporter::plyPlan(const Element& element, ElementPlan& plan) {
         // A lone index (not a list) and indices outside an index element are the receiver's.
         if (m_primitive && element.properties[p].isList) property.kind = PropertyPlan::Kind::indices;
         break;
+      case Route::Kind::faceItems:
+        property = {PropertyPlan::Kind::itemList, Conversion::toFloat};
+        property.sink = itemSink;
+        break;
+      case Route::Kind::customList:
       case Route::Kind::material:
         break;
     }
@@ -362,6 +361,12 @@ void PLYImporter::plyProperty(const Element& element, const Property& property, 
     case Route::Kind::indices:
       storeIndices(property, values);
       return;
+    case Route::Kind::faceItems:
+      storeFaceItems(property, values);
+      return;
+    case Route::Kind::customList:
+      storeCustomList(route, property, values);
+      return;
     case Route::Kind::material:
       if (!values.empty()) storeMaterialValue(property, toFP(values[0], property));
       return;
@@ -371,8 +376,10 @@ void PLYImporter::plyProperty(const Element& element, const Property& property, 
 void PLYImporter::storeValue(const Route& route, const Property& property, const ValueArray& values) {
   const Target& target = m_targets[route.target];
   if (values.empty() || m_instanceIndex >= target.size()) return;
+  std::byte* at = target.resize(0) + std::size_t(m_instanceIndex) * target.stride + route.offset;
+  if (route.conversion == Conversion::native) return storeNative(values[0], property.type, at);
   const float value = converted(values[0], property, route.conversion);
-  std::memcpy(target.resize(0) + std::size_t(m_instanceIndex) * target.stride + route.offset, &value, sizeof value);
+  std::memcpy(at, &value, sizeof value);
 }
 
 void PLYImporter::storeIndices(const Property& property, const ValueArray& values) {
@@ -391,7 +398,7 @@ void PLYImporter::storeIndices(const Property& property, const ValueArray& value
   for (std::size_t k = 0; k < values.size(); ++k) {
     m_scratch[k] = static_cast<std::uint32_t>(values[k].convertTo<std::int64_t>(property.type));
   }
-  detail::storeIndexList(m_sink, m_scratch.data(), m_scratch.size(), m_badIndices);
+  detail::storeList(m_sink, m_scratch.data(), m_scratch.size(), m_badIndices);
 }
 
 }  // namespace ply

@@ -31,6 +31,12 @@ base::name_id columnPlansParameter() {
   return name;
 }
 
+// Beside the seven: keeps the properties that no semantic claims (ply_custom_properties.cpp).
+base::name_id customPropertiesParameter() {
+  static const base::name_id name = base::intern("importCustomProperties");
+  return name;
+}
+
 bool isBlank(std::uint8_t c) { return c == ' ' || c == '\t' || c == '\r' || c == '\n'; }
 
 // The box of the positions, inverted (largest float to its negative) when there are none.
@@ -80,6 +86,7 @@ void PLYImporter::getParameters(base::AttribMap& parameters) {
   parameters.attribute<std::uint8_t>(sceneImporter_schema::importNormals(), 2);
   parameters.attribute<bool>(sceneImporter_schema::importMaterials(), true);
   parameters.attribute<bool>(sceneImporter_schema::importPoints(), true);
+  parameters.attribute<bool>(customPropertiesParameter(), false);
   parameters.setMapType(sceneImporter_schema::typeName());
 }
 
@@ -101,12 +108,16 @@ bool PLYImporter::importScene(base::PluginFactory& factory, std::string_view pat
   syncAttribute(sceneImporter_schema::importNormals(), m_importNormals);
   syncAttribute(sceneImporter_schema::importMaterials(), m_importMaterials);
   syncAttribute(sceneImporter_schema::importPoints(), m_importPoints);
+  syncAttribute(customPropertiesParameter(), m_importCustomProperties);
   if (const bool* plans = findAttribute<bool>(columnPlansParameter())) m_columnPlans = *plans;
 
   m_positionsList = nullptr;
   m_normalsList = nullptr;
   m_indicesList = nullptr;
   m_vcountsList = nullptr;
+  m_customLists.clear();
+  m_faceReorders.clear();
+  m_faceChannels.clear();
   const base::Stream file = base::fs::master().open(path, base::fs::openForReading);
   base::Stream stream = base::progressStream(file, fmt::format("Importing {}", path));
   m_currentMesh = createRequired(factory, mesh_schema::typeName());
@@ -128,7 +139,7 @@ bool PLYImporter::importScene(base::PluginFactory& factory, std::string_view pat
   }
   finishPrimitives();
   base::log().message(base::logScene, base::logDebug, "Encoding the index deltas.");
-  scene::encodeIndexDeltas(*m_currentMesh);
+  encodeWithFaceOrder();
   base::log().message(base::logScene, base::logDebug, "Building the scene.");
   createMaterials(factory);
   buildScene(factory);
@@ -136,6 +147,7 @@ bool PLYImporter::importScene(base::PluginFactory& factory, std::string_view pat
 }
 
 void PLYImporter::finishPrimitives() {
+  padFaceChannels();
   base::AttribArray& primitives = scene::arrayMember(*m_currentMesh, mesh_schema::primitives());
   if (primitives.size() == 0) {
     base::AttribMap& points = scene::appendMap(primitives);

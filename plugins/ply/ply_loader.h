@@ -15,6 +15,11 @@
 
 namespace ply {
 
+/// The semantic the importer reads a property as: its own, or for names that other tools
+/// give texture coordinates (texture_u/texture_v, texture_s/texture_t) u and v. The header
+/// keeps them as unknown names: only the import reads them as coordinates.
+PropertySemantic importedSemantic(const Property& property);
+
 /// Reads a PLY file into a scene: one mesh (vertex data, one primitive per face, strip or
 /// edge element, all sharing one index list), its materials, a root node and a scene. It is
 /// the body reader's receiver: each element is decided once (plyElement, plyPlan), and the
@@ -50,7 +55,14 @@ class PLYImporter final : public scene::SceneImportPlugin {
   static constexpr std::uint32_t noTarget = 0xFFFFFFFFu;
   /// Where one property of the current element goes.
   struct Route {
-    enum class Kind : std::uint8_t { drop, value, indices, material } kind = Kind::drop;
+    enum class Kind : std::uint8_t {
+      drop,
+      value,       ///< a scalar into a target (Conversion::native for kept custom properties)
+      indices,     ///< vertex indices into the index sink
+      faceItems,   ///< a face's texture coordinates into the item sink
+      customList,  ///< a kept custom list, through plyProperty into m_customLists[target]
+      material
+    } kind = Kind::drop;
     Conversion conversion = Conversion::toFloat;
     std::uint32_t target = 0;
     std::uint32_t offset = 0;
@@ -71,6 +83,23 @@ class PLYImporter final : public scene::SceneImportPlugin {
                                  std::uint32_t channel);
   void storeValue(const Route& route, const Property& property, const ValueArray& values);
   void storeIndices(const Property& property, const ValueArray& values);
+
+  // Per-face data (ply_face_data.cpp): texture coordinates and colours of the face element
+  // as face-varying sets, whose index channels the delta encoding moves with the faces.
+  void prepareFaceData(const Element& element);
+  void storeFaceItems(const Property& property, const ValueArray& values);
+  void finishFaceData();
+  void finishFaceUVs(std::uint32_t start, std::uint32_t corners);
+  base::vector<std::uint32_t>& newFaceChannel(base::AttribMap& set, std::uint32_t start, std::uint32_t corners);
+  void padFaceChannels();
+
+  // Kept custom properties (ply_custom_properties.cpp): a typed mesh list per property
+  // that no semantic claims, per-face ones put in the order the delta encoding gives the faces.
+  void prepareCustomProperties(const Element& element);
+  std::uint32_t addCustomColumn(const Element& element, const Property& property);
+  void storeCustomList(const Route& route, const Property& property, const ValueArray& values);
+  base::string customName(const Element& element, std::string_view name);
+  void encodeWithFaceOrder();
   void storeMaterialValue(const Property& property, float value);
 
   /// An object of `type` made by `factory`; throws when the factory cannot make one.
@@ -88,6 +117,7 @@ class PLYImporter final : public scene::SceneImportPlugin {
   std::uint8_t m_importNormals = 2;
   bool m_importMaterials = true;
   bool m_importPoints = true;
+  bool m_importCustomProperties = false;
   /// Off only for tests that compare the column plans with the per-property path.
   bool m_columnPlans = true;
 
@@ -112,12 +142,47 @@ class PLYImporter final : public scene::SceneImportPlugin {
   const Element* m_element = nullptr;
   base::vector<Target> m_targets;
   base::vector<Route> m_routes;
-  IndexSink m_sink;
+  ListSink m_sink;
   base::AttribMap* m_primitive = nullptr;
   std::uint32_t m_primitiveStart = 0;
   std::uint32_t m_instanceIndex = 0;
   base::vector<std::uint32_t> m_scratch;
   BadIndexReport m_badIndices;
+
+  // The face element's texture coordinates as read (float bits, and the count of each
+  // face's list), until its element ends and they become a face-varying UV set.
+  ListSink m_itemSink;
+  base::vector<std::uint32_t> m_faceItems;
+  base::vector<std::uint16_t> m_faceItemCounts;
+  base::AttribMap* m_faceUVSet = nullptr;
+  /// The face element's colour set (one colour per face), until its element ends.
+  base::AttribMap* m_faceColourSet = nullptr;
+  /// Face-varying index channels, padded to the whole index list when the mesh is done.
+  base::vector<base::vector<std::uint32_t>*> m_faceChannels;
+
+  /// A kept custom list property: its counts and the type-erased append of its items.
+  struct CustomList {
+    base::vector<std::uint32_t>* counts;
+    std::function<void(const ValueArray&, DataType)> append;
+  };
+  base::vector<CustomList> m_customLists;
+  /// Per-face custom data of the face primitive `primitive`, put in the faces' new order
+  /// (order[k] is the index the face at k had in the file).
+  struct FaceReorder {
+    std::uint32_t primitive;
+    std::function<void(const base::vector<std::uint32_t>& order)> apply;
+  };
+  base::vector<FaceReorder> m_faceReorders;
 };
+
+template <class T>
+std::uint32_t PLYImporter::addTarget(base::vector<T>& list) {
+  m_targets.push_back({[&list](std::size_t records) {
+                         if (records > list.size()) list.resize(records);
+                         return reinterpret_cast<std::byte*>(list.data());
+                       },
+                       [&list] { return list.size(); }, sizeof(T)});
+  return static_cast<std::uint32_t>(m_targets.size() - 1);
+}
 
 }  // namespace ply

@@ -13,23 +13,42 @@ bool ElementPlan::delivers() const {
   });
 }
 
-bool ElementPlan::fits() const {
-  return std::all_of(properties.begin(), properties.end(), [this](const PropertyPlan& property) {
-    switch (property.kind) {
-      case PropertyPlan::Kind::scalar:
-      case PropertyPlan::Kind::valueList: {
-        const std::uint64_t words = property.kind == PropertyPlan::Kind::scalar ? 1 : property.length;
-        return property.array < arrays.size() && arrays[property.array].resize &&
-               std::uint64_t(property.offset) + 4 * words <= arrays[property.array].stride;
-      }
-      case PropertyPlan::Kind::indices:
-        return property.sink < sinks.size() && sinks[property.sink].indices;
-      case PropertyPlan::Kind::deliver:
-      case PropertyPlan::Kind::skip:
-        return true;
+namespace {
+
+// Bytes that one stored value takes.
+std::uint64_t storedSize(const Property& property, const PropertyPlan& plan) {
+  return plan.conversion == Conversion::native ? dataTypeSize(property.type) : 4;
+}
+
+bool fitsOne(const ElementPlan& plan, const Property& property, const PropertyPlan& target) {
+  switch (target.kind) {
+    case PropertyPlan::Kind::scalar:
+    case PropertyPlan::Kind::valueList: {
+      if (target.kind == PropertyPlan::Kind::valueList && target.conversion == Conversion::native) return false;
+      const std::uint64_t values = target.kind == PropertyPlan::Kind::scalar ? 1 : target.length;
+      return target.array < plan.arrays.size() && plan.arrays[target.array].resize &&
+             std::uint64_t(target.offset) + storedSize(property, target) * values <= plan.arrays[target.array].stride;
     }
-    return false;
-  });
+    case PropertyPlan::Kind::itemList:
+      if (target.conversion == Conversion::native || target.conversion == Conversion::toIndex) return false;
+      [[fallthrough]];
+    case PropertyPlan::Kind::indices:
+      return target.sink < plan.sinks.size() && plan.sinks[target.sink].items;
+    case PropertyPlan::Kind::deliver:
+    case PropertyPlan::Kind::skip:
+      return true;
+  }
+  return false;
+}
+
+}  // namespace
+
+bool ElementPlan::fits(const Element& element) const {
+  if (properties.size() != element.properties.size()) return false;
+  for (std::size_t p = 0; p < properties.size(); ++p) {
+    if (!fitsOne(*this, element.properties[p], properties[p])) return false;
+  }
+  return true;
 }
 
 void BadIndexReport::note(std::uint32_t index, std::uint32_t vertexCount) {
@@ -65,7 +84,7 @@ void PlanTargets::grow(std::uint64_t records) {
 }
 
 void checkIndices(std::uint32_t* indices, std::size_t count, std::uint32_t vertexCount, BadIndexReport& report) {
-  if (vertexCount == IndexSink::noRangeCheck) return;
+  if (vertexCount == ListSink::noRangeCheck) return;
   for (std::size_t k = 0; k < count; ++k) {
     // Rare: the branch is taken only for bad files.
     if (indices[k] >= vertexCount) [[unlikely]] {
@@ -75,19 +94,19 @@ void checkIndices(std::uint32_t* indices, std::size_t count, std::uint32_t verte
   }
 }
 
-void reserveAhead(const IndexSink& sink, std::optional<std::uint64_t> bytesLeft, std::uint64_t instancesLeft,
+void reserveAhead(const ListSink& sink, std::optional<std::uint64_t> bytesLeft, std::uint64_t instancesLeft,
                   std::uint32_t count, std::uint32_t itemBytes) {
   if (!bytesLeft) return;
   const std::uint64_t items = std::min(instancesLeft * count, *bytesLeft / itemBytes + count);
-  if (sink.indices->capacity() < sink.indices->size() + items) sink.indices->reserve(sink.indices->size() + items);
+  if (sink.items->capacity() < sink.items->size() + items) sink.items->reserve(sink.items->size() + items);
   const std::uint64_t lists = std::min(instancesLeft, *bytesLeft / itemBytes + 1);
   if (sink.listCounts && sink.listCounts->capacity() < sink.listCounts->size() + lists) {
     sink.listCounts->reserve(sink.listCounts->size() + lists);
   }
 }
 
-void storeIndexList(const IndexSink& sink, const std::uint32_t* items, std::size_t count, BadIndexReport& report) {
-  base::vector<std::uint32_t>& indices = *sink.indices;
+void storeList(const ListSink& sink, const std::uint32_t* items, std::size_t count, BadIndexReport& report) {
+  base::vector<std::uint32_t>& indices = *sink.items;
   if (!sink.runCounts) {
     base::reserveForAppend(indices, count);
     const std::size_t first = indices.size();

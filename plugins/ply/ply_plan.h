@@ -20,6 +20,8 @@ enum class Conversion : std::uint8_t {
   toFloat,     ///< float: the value's float (Value::convertTo<float>)
   normalised,  ///< float: ply::toFP (integer types divided by their largest value)
   toIndex,     ///< uint32: the low 32 bits of Value::convertTo<std::int64_t>
+  native,      ///< the value in its own type, dataTypeSize bytes (an ASCII word beyond the
+               ///< type's range keeps the low bits, as a cast does); scalars only
 };
 
 /// A growable array of fixed-size records that the receiver owns (a mesh's position list, say).
@@ -32,11 +34,13 @@ struct RecordArray {
   std::uint32_t stride = 0;  ///< bytes from one record to the next
 };
 
-/// Where the items of an index list go (faces, strips, edges).
-struct IndexSink {
-  /// Every stored index is appended here.
-  base::vector<std::uint32_t>* indices = nullptr;
-  /// When set, an index not below it is stored as 0 and reported (see BadIndexReport).
+/// Where the items of a list go, one list per instance after the other: the indices of
+/// faces, strips and edges, or the 32-bit values of another list (a face's texture
+/// coordinates as float bits).
+struct ListSink {
+  /// Every stored item is appended here.
+  base::vector<std::uint32_t>* items = nullptr;
+  /// When set, an item not below it is stored as 0 and reported (see BadIndexReport).
   std::uint32_t vertexCount = noRangeCheck;
   /// Each list's length, when set (a face element's vertex counts).
   base::vector<std::uint16_t>* listCounts = nullptr;
@@ -56,7 +60,8 @@ struct PropertyPlan {
     deliver,    ///< through plyProperty, as without a plan
     skip,       ///< not wanted: read past
     scalar,     ///< a scalar to `offset` in record i of `array`
-    indices,    ///< a list to `sink`
+    indices,    ///< a list of indices to `sink`
+    itemList,   ///< a list of values to `sink`, each stored by `conversion` (not toIndex)
     valueList,  ///< a list of exactly `length` items to `offset` in record i of `array`,
                 ///< item k at offset + 4k; another length goes through plyProperty
   };
@@ -66,6 +71,11 @@ struct PropertyPlan {
   std::uint32_t offset = 0;
   std::uint32_t length = 0;
   std::uint32_t sink = 0;
+
+  /// Whether the property's lists go to `sink`.
+  bool toSink() const { return kind == Kind::indices || kind == Kind::itemList; }
+  /// How the values are stored: indices always by toIndex.
+  Conversion storedAs() const { return kind == Kind::indices ? Conversion::toIndex : conversion; }
 };
 
 /// The plan of one element: a PropertyPlan per property, in header order, and the arrays
@@ -74,16 +84,16 @@ struct PropertyPlan {
 struct ElementPlan {
   base::vector<PropertyPlan> properties;
   base::vector<RecordArray> arrays;
-  base::vector<IndexSink> sinks;
+  base::vector<ListSink> sinks;
 
   void clear() {
     properties.clear();
     arrays.clear();
     sinks.clear();
   }
-  /// Whether every property names an array or sink that exists and every target lies
-  /// inside its record.
-  bool fits() const;
+  /// Whether the plan has a property plan per property of `element`, every one names an
+  /// array or sink that exists, and every target lies inside its record.
+  bool fits(const Element& element) const;
   /// Whether some property may go to plyProperty: one to deliver, or a list that another
   /// length sends back to the receiver.
   bool delivers() const;

@@ -4,6 +4,7 @@
 #include "ply_columns.h"
 
 #include <cstdint>
+#include <cstring>
 #include <limits>
 
 namespace ply {
@@ -66,6 +67,30 @@ float toFP(const Value& value, const Property& property) {
       break;
   }
   base::raise<base::switch_exception>("ply::toFP");
+}
+
+void storeNative(const Value& value, DataType type, void* target) {
+  const auto store = [target](auto native) { std::memcpy(target, &native, sizeof native); };
+  switch (type) {
+    case DataType::int8:
+      return store(static_cast<std::int8_t>(value.i));
+    case DataType::uint8:
+      return store(static_cast<std::uint8_t>(value.u));
+    case DataType::int16:
+      return store(static_cast<std::int16_t>(value.i));
+    case DataType::uint16:
+      return store(static_cast<std::uint16_t>(value.u));
+    case DataType::int32:
+      return store(value.i);
+    case DataType::uint32:
+      return store(value.u);
+    case DataType::float32:
+      return store(value.f);
+    case DataType::float64:
+      return store(value.d);
+    case DataType::none:
+      break;
+  }
 }
 
 }  // namespace ply

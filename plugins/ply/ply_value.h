@@ -39,6 +39,10 @@ static_assert(sizeof(Value) == 8);
 /// The values of one property instance: one for a scalar, the list's items for a list.
 using ValueArray = base::vector<Value>;
 
+/// Writes the value in the bytes of its own type (dataTypeSize(type) of them, in the
+/// machine's order): an integer keeps its low bits, as a cast does.
+void storeNative(const Value& value, DataType type, void* target);
+
 /// The float conversion, with integer types normalised by one over the type's largest value
 /// (uchar 255 gives 1.0); floats and doubles unchanged.
 float toFP(const Value& value, const Property& property);

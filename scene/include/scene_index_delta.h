@@ -12,13 +12,15 @@ namespace scene {
 /// start at its smallest index (keeping its winding), the faces of a primitive are sorted,
 /// and the first channel holds differences; the other channels move in step. Every later
 /// user of face order (face-varying data, per-face attributes) must be encoded with it.
-/// False, with the mesh unchanged, for a mesh without indices, one already marked, or one
-/// whose channels are links or differ in length.
+/// `companions` are channels of the caller's that move in step as well (per-corner face
+/// numbers, say, to learn the new order of per-face data). False, with the mesh unchanged,
+/// for a mesh without indices, one already marked, or one whose channels (companions too)
+/// are links or differ in length.
 ///
 /// A primitive is left as it is without `vcounts` (strips), with a `vcounts` list holding a
 /// count below 3, or with a single count outside 2 to 4; a range beyond the channels is cut
 /// to them, and faces that the range does not hold whole are left out.
-bool encodeIndexDeltas(base::AttribMap& mesh);
+bool encodeIndexDeltas(base::AttribMap& mesh, std::span<base::vector<std::uint32_t>* const> companions = {});
 
 /// Encodes one primitive's range: `channels` point at the range's first index in each
 /// channel, `count` indices each. `faceCounts` (rewritten in the sorted order) gives each

@@ -99,7 +99,8 @@ void encodeRange(std::span<std::uint32_t* const> channels, std::uint32_t count, 
 
 // The channels of a mesh, first channel first; false (logged where the reason is the
 // channels themselves) when the mesh cannot be encoded.
-bool gatherChannels(base::AttribMap& mesh, base::vector<std::uint32_t*>& channels, std::uint32_t& length) {
+bool gatherChannels(base::AttribMap& mesh, base::vector<std::uint32_t*>& channels, std::uint32_t& length,
+                    std::span<base::vector<std::uint32_t>* const> companions = {}) {
   base::vector<base::vector<std::uint32_t>*> lists;
   bool linked = false;
   const auto add = [&](base::AttribMap& map, base::name_id name) {
@@ -121,6 +122,7 @@ bool gatherChannels(base::AttribMap& mesh, base::vector<std::uint32_t*>& channel
       if (base::AttribMap* set = mapAt(*array, i)) add(*set, meshUVSet_schema::indices());
     }
   }
+  lists.insert(lists.end(), companions.begin(), companions.end());
   length = static_cast<std::uint32_t>(lists[0]->size());
   const bool inStep = std::all_of(lists.begin(), lists.end(), [&](const auto* list) { return list->size() == length; });
   if (linked || !inStep) {
@@ -193,11 +195,11 @@ void decodeRangeDeltas(std::uint32_t* channel, std::uint32_t count, std::span<co
   });
 }
 
-bool encodeIndexDeltas(base::AttribMap& mesh) {
+bool encodeIndexDeltas(base::AttribMap& mesh, std::span<base::vector<std::uint32_t>* const> companions) {
   if (marked(mesh)) return false;
   base::vector<std::uint32_t*> channels;
   std::uint32_t length = 0;
-  if (!gatherChannels(mesh, channels, length)) return false;
+  if (!gatherChannels(mesh, channels, length, companions)) return false;
   base::vector<std::uint32_t*> atStart(channels.size());
   detail::FaceSortScratch scratch;  // one for every range of the mesh
   forEachEncodableRange(

@@ -224,7 +224,11 @@ TEST(PlyImport, PerFaceDataLeavesTheVertexDataAlone) {
       "end_header\n0 1 0.5\n1 1 0.5\n2 1 0.5\n3 0 1 2 -5 255 0.25\n");
   EXPECT_EQ(list<base::normal>(imported.mesh(), mesh_schema::normals())[0].x, 1.0f);
   EXPECT_EQ(setList<float>(imported.mesh(), mesh_schema::colorSets(), 0, meshColorSet_schema::A())[0], 0.5f);
-  EXPECT_EQ(log.entries.front().text, "Per face colors are not supported, will be ignored!");
+  // The face's red is a colour set of its own, one colour per face.
+  EXPECT_EQ(setList<Vec3>(imported.mesh(), mesh_schema::colorSets(), 1, meshColorSet_schema::RGB()),
+            (base::vector<Vec3>{{1, 0, 0}}));
+  EXPECT_TRUE(std::none_of(log.entries.begin(), log.entries.end(),
+                           [](const auto& entry) { return entry.text.find("Per face") != std::string::npos; }));
 }
 
 TEST(PlyImport, AVertexElementWithOnlyOpacityIsNotRead) {
@@ -320,8 +324,10 @@ TEST(PlyImport, TheImporterObject) {
 
   base::AttribMap parameters;
   scene::importerOf(*importer)->getParameters(parameters);
-  EXPECT_EQ(parameters.size(), 7u);
+  // The seven, and the switch for properties that no semantic claims, off.
+  EXPECT_EQ(parameters.size(), 8u);
   EXPECT_EQ(*parameters.findAttribute<std::uint8_t>(scene::sceneImporter_schema::importNormals()), 2u);
+  EXPECT_FALSE(*parameters.findAttribute<bool>(base::intern("importCustomProperties")));
   EXPECT_EQ(parameters.mapType(), scene::sceneImporter_schema::typeName());
 
   const TemporaryFile upper("a.ply", "\r\n  PLY\nformat");

@@ -75,7 +75,7 @@ class RuleReceiver {
     finishElement();
     m_current = &element;
     m_element = std::string(ply::displayName(element));
-    if (element.semantic == ply::ElementSemantic::vertex && m_vertexCount == ply::IndexSink::noRangeCheck) {
+    if (element.semantic == ply::ElementSemantic::vertex && m_vertexCount == ply::ListSink::noRangeCheck) {
       m_vertexCount = element.count;
     }
     return true;
@@ -106,7 +106,7 @@ class RuleReceiver {
   void plyProperty(const ply::Element& element, const ply::Property& property, const ply::ValueArray& values) {
     const std::size_t p = static_cast<std::size_t>(&property - element.properties.data());
     const ply::PropertyPlan plan = planFor(element, p);
-    const ply::IndexSink indexSink = sink(element);
+    const ply::ListSink indexSink = sink(element);
     if (!m_plans && plan.kind == Kind::scalar) {
       cell(p, 1, 0) = storedBits(values[0], property, plan.conversion);
     } else if (!m_plans && plan.kind == Kind::indices && values.size() <= indexSink.maxLength) {
@@ -146,9 +146,9 @@ class RuleReceiver {
     return target[m_instance * words + k];
   }
 
-  ply::IndexSink sink(const ply::Element& element) {
-    ply::IndexSink sink;
-    sink.indices = &m_indices;
+  ply::ListSink sink(const ply::Element& element) {
+    ply::ListSink sink;
+    sink.items = &m_indices;
     sink.vertexCount = m_vertexCount;
     if (element.semantic == ply::ElementSemantic::tristrips) {
       sink.runCounts = &m_runCounts[m_element];
@@ -160,7 +160,7 @@ class RuleReceiver {
   }
 
   // The same rules as the reader's index sink, written out per list.
-  void storeIndices(const ply::IndexSink& sink, const ply::ValueArray& values, const ply::Property& property) {
+  void storeIndices(const ply::ListSink& sink, const ply::ValueArray& values, const ply::Property& property) {
     std::uint32_t run = 0;
     for (const ply::Value& value : values) {
       std::uint32_t index = static_cast<std::uint32_t>(value.convertTo<std::int64_t>(property.type));
@@ -168,7 +168,7 @@ class RuleReceiver {
         if (run > 0) sink.runCounts->push_back(std::exchange(run, 0u));
         continue;
       }
-      if (sink.vertexCount != ply::IndexSink::noRangeCheck && index >= sink.vertexCount) {
+      if (sink.vertexCount != ply::ListSink::noRangeCheck && index >= sink.vertexCount) {
         m_report.note(index, sink.vertexCount);
         index = 0;
       }
@@ -184,7 +184,7 @@ class RuleReceiver {
   const ply::Element* m_current = nullptr;
   std::string m_element;
   std::uint32_t m_instance = 0;
-  std::uint32_t m_vertexCount = ply::IndexSink::noRangeCheck;
+  std::uint32_t m_vertexCount = ply::ListSink::noRangeCheck;
   ply::BadIndexReport m_report;
 
  public:
