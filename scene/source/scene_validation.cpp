@@ -8,6 +8,7 @@
 #include "scene_mesh.h"
 #include "scene_schema.h"
 
+#include <algorithm>
 #include <cmath>
 #include <optional>
 
@@ -76,6 +77,41 @@ bool checkOptional(const base::AttribMap& map, base::name_id name, std::string_v
   return !vectors || checkVectors(*vectors, mesh, check);
 }
 
+// A set with an index channel of its own (face-varying data) holds as many entries as its
+// channel needs: the channel runs in step with the mesh's indices, and each of its values
+// names an entry or is the set's invalid index.
+bool checkSetChannel(const base::AttribMap& set, std::size_t entries, std::size_t corners, std::string_view mesh,
+                     std::string_view label) {
+  const base::vector<std::uint32_t>* channel = listMember<std::uint32_t>(set, meshUVSet_schema::indices());
+  if (!channel) return true;
+  if (channel->size() != corners) {
+    base::log().message(logScene, logError, "validate |{}| The {} index channel and indices count doesn't match!", mesh,
+                        label);
+    return false;
+  }
+  const std::uint32_t invalid =
+      scalarMember<std::uint32_t>(set, meshUVSet_schema::invalidIndex()).value_or(0xFFFFFFFFu);
+  const auto bad = std::find_if(channel->begin(), channel->end(),
+                                [&](std::uint32_t value) { return value != invalid && value >= entries; });
+  if (bad == channel->end()) return true;
+  base::log().message(logScene, logError, "validate |{}| Found {} index out of range at position {}!", mesh, label,
+                      bad - channel->begin());
+  return false;
+}
+
+// Whether the set has an index channel of its own: its lists then need not match the vertices.
+bool hasOwnChannel(const base::AttribMap& set) {
+  return listMember<std::uint32_t>(set, meshUVSet_schema::indices()) != nullptr;
+}
+
+// The entries of a set: the longest of its layouts.
+template <class One, class Three, class Four>
+std::size_t entriesOf(const base::AttribMap& set, base::name_id one, base::name_id three, base::name_id four) {
+  const auto sizeOf = [](const auto* list) -> std::size_t { return list ? list->size() : 0; };
+  return std::max(
+      {sizeOf(listMember<One>(set, one)), sizeOf(listMember<Three>(set, three)), sizeOf(listMember<Four>(set, four))});
+}
+
 // The vertex data: positions, normals, tangents, velocities, colour and UV sets.
 bool checkVertexData(const base::AttribMap& mesh, std::string_view name, std::size_t vertices) {
   bool valid = true;
@@ -85,20 +121,32 @@ bool checkVertexData(const base::AttribMap& mesh, std::string_view name, std::si
   valid &= checkOptional<base::normal>(mesh, mesh_schema::normals(), name, {"normals", vertices, true, true});
   valid &= checkOptional<Vec3>(mesh, mesh_schema::tangents(), name, {"tangents", vertices, true, true});
   valid &= checkOptional<Vec3>(mesh, mesh_schema::velocities(), name, {"velocities", vertices});
+  const base::vector<std::uint32_t>* indices = listMember<std::uint32_t>(mesh, mesh_schema::indices());
+  const std::size_t corners = indices ? indices->size() : 0;
   const base::AttribArray* colours = findArrayMember(mesh, mesh_schema::colorSets());
   for (std::uint32_t i = 0; colours && i < colours->size(); ++i) {
     const base::AttribMap* set = mapAt(*colours, i);
     if (!set) continue;
-    valid &= checkOptional<Vec3>(*set, meshColorSet_schema::RGB(), name, {"rgb colors", vertices});
-    valid &= checkOptional<Vec4>(*set, meshColorSet_schema::RGBA(), name, {"rgba colors", vertices});
+    const std::size_t expected = hasOwnChannel(*set) ? 0 : vertices;
+    valid &= checkOptional<Vec3>(*set, meshColorSet_schema::RGB(), name, {"rgb colors", expected});
+    valid &= checkOptional<Vec4>(*set, meshColorSet_schema::RGBA(), name, {"rgba colors", expected});
+    valid &= checkSetChannel(*set,
+                             entriesOf<float, Vec3, Vec4>(*set, meshColorSet_schema::A(), meshColorSet_schema::RGB(),
+                                                          meshColorSet_schema::RGBA()),
+                             corners, name, "color");
   }
   const base::AttribArray* uvs = findArrayMember(mesh, mesh_schema::uvSets());
   for (std::uint32_t i = 0; uvs && i < uvs->size(); ++i) {
     const base::AttribMap* set = mapAt(*uvs, i);
     if (!set) continue;
-    valid &= checkOptional<Vec2>(*set, meshUVSet_schema::UV(), name, {"uv coordinates", vertices});
-    valid &= checkOptional<Vec3>(*set, meshUVSet_schema::UVW(), name, {"uvw coordinates", vertices});
-    valid &= checkOptional<Vec4>(*set, meshUVSet_schema::UVWQ(), name, {"uvwq coordinates", vertices});
+    const std::size_t expected = hasOwnChannel(*set) ? 0 : vertices;
+    valid &= checkOptional<Vec2>(*set, meshUVSet_schema::UV(), name, {"uv coordinates", expected});
+    valid &= checkOptional<Vec3>(*set, meshUVSet_schema::UVW(), name, {"uvw coordinates", expected});
+    valid &= checkOptional<Vec4>(*set, meshUVSet_schema::UVWQ(), name, {"uvwq coordinates", expected});
+    valid &= checkSetChannel(
+        *set,
+        entriesOf<Vec2, Vec3, Vec4>(*set, meshUVSet_schema::UV(), meshUVSet_schema::UVW(), meshUVSet_schema::UVWQ()),
+        corners, name, "uv");
   }
   return valid;
 }

@@ -4,6 +4,7 @@
 #include "b_vec.h"
 #include "log_capture.h"
 #include "scene_import.h"
+#include "scene_validation.h"
 
 #include <fmt/format.h>
 #include <fmt/ranges.h>
@@ -100,6 +101,7 @@ std::string binaryFile(const std::vector<Face>& faces) {
 // Every corner of the decoded mesh against the file: its face (known by its vertices), its
 // coordinates and its face's colour.
 void expectCornersKeepTheirData(base::AttribMap& mesh, const std::vector<Face>& faces, bool textUVs) {
+  EXPECT_TRUE(scene::validateMesh(mesh));
   ASSERT_TRUE(scene::decodeIndexDeltas(mesh));
   const auto& indices = list<std::uint32_t>(mesh, mesh_schema::indices());
   const auto& uvs = setList<UV>(mesh, mesh_schema::uvSets(), 0, meshUVSet_schema::UV());
@@ -176,6 +178,7 @@ TEST(FaceData, CornersOfOtherPrimitivesHoldTheInvalidIndex) {
                                       "uchar float texcoord\nend_header\n0\n1\n2\n2 2 1\n3 1 2 0 255 255 0 6 1 2 3 "
                                       "4 5 6\n");
   base::AttribMap& mesh = imported.mesh();
+  EXPECT_TRUE(scene::validateMesh(mesh));
   ASSERT_TRUE(scene::decodeIndexDeltas(mesh));
   EXPECT_EQ(list<std::uint32_t>(mesh, mesh_schema::indices()), (base::vector<std::uint32_t>{1, 2, 0, 1, 2}));
   EXPECT_EQ(setList<std::uint32_t>(mesh, mesh_schema::uvSets(), 0, meshUVSet_schema::indices()),

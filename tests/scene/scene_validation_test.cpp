@@ -162,3 +162,24 @@ TEST(ValidateMesh, ADeltaEncodedMeshIsCheckedOnItsPlainIndices) {
 }
 
 }  // namespace
+
+TEST(ValidateMeshSets, ASetWithItsOwnChannelIsCheckedByItsChannel) {
+  using UV = base::base_vec2<float>;
+  base::AttribMap mesh;
+  makeTriangles(mesh, 3, {0, 1, 2, 2, 1, 0});
+  base::AttribMap& uvs = scene::appendMap(scene::arrayMember(mesh, mesh_schema::uvSets()));
+  uvs.attribute(scene::meshUVSet_schema::UV(), base::vector<UV>(4));  // four entries for three vertices
+  uvs.attribute(scene::meshUVSet_schema::indices(), Indices{0, 1, 2, 3, 0xFFFFFFFFu, 1});
+  base::AttribMap& colours = scene::appendMap(scene::arrayMember(mesh, mesh_schema::colorSets()));
+  colours.attribute(scene::meshColorSet_schema::RGB(), base::vector<Vec3>(2));  // one per face
+  colours.attribute(scene::meshColorSet_schema::indices(), Indices{0, 0, 0, 1, 1, 1});
+  EXPECT_TRUE(validate(mesh).valid);
+
+  colours.attribute(scene::meshColorSet_schema::indices(), Indices{0, 0, 0, 1, 1, 2});
+  uvs.attribute(scene::meshUVSet_schema::indices(), Indices{0, 1, 2});
+  const Validation bad = validate(mesh);
+  EXPECT_FALSE(bad.valid);
+  EXPECT_EQ(bad.findings,
+            (std::vector<std::string>{"error: validate |m| Found color index out of range at position 5!",
+                                      "error: validate |m| The uv index channel and indices count doesn't match!"}));
+}

@@ -8,8 +8,11 @@
 #include "scene_validation.h"
 
 #include <fmt/format.h>
+#include <fmt/ranges.h>
 
+#include <algorithm>
 #include <string>
+#include <vector>
 
 namespace scenetool {
 namespace {
@@ -42,6 +45,19 @@ std::string meshDetails(const base::AttribMap& mesh) {
   return text;
 }
 
+// The properties the importer kept beside the mesh's own data ("ply:NAME" lists), with
+// their types; empty when there are none.
+std::string keptProperties(const base::AttribMap& mesh) {
+  std::vector<std::string> kept;
+  for (const auto& [name, attribute] : mesh.members()) {
+    if (base::text(name).starts_with("ply:")) {
+      kept.push_back(fmt::format("{} ({})", base::text(name), base::text(attribute->type())));
+    }
+  }
+  std::sort(kept.begin(), kept.end());
+  return kept.empty() ? std::string() : fmt::format("  kept properties: {}\n", fmt::join(kept, ", "));
+}
+
 }  // namespace
 
 void printSceneSummary(const base::PluginFactory& factory) {
@@ -51,7 +67,7 @@ void printSceneSummary(const base::PluginFactory& factory) {
     const std::string label = fmt::format("object {}: {}{}", object->index(), base::text(object->mapType()),
                                           name.empty() ? std::string() : fmt::format(" '{}'", name));
     if (object->mapType() == mesh_schema::typeName()) {
-      fmt::print("{}: {}\n", label, meshDetails(*object));
+      fmt::print("{}: {}\n{}", label, meshDetails(*object), keptProperties(*object));
     } else {
       fmt::print("{} ({})\n", label, plural(object->size(), "attribute", "attributes"));
     }
