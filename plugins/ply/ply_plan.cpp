@@ -45,8 +45,14 @@ bool fitsOne(const ElementPlan& plan, const Property& property, const PropertyPl
 
 bool ElementPlan::fits(const Element& element) const {
   if (properties.size() != element.properties.size()) return false;
+  // A run of instances goes into each sink list by list, so one sink serves one property.
+  base::vector<bool> taken(sinks.size(), false);
   for (std::size_t p = 0; p < properties.size(); ++p) {
     if (!fitsOne(*this, element.properties[p], properties[p])) return false;
+    if (properties[p].toSink()) {
+      if (taken[properties[p].sink]) return false;
+      taken[properties[p].sink] = true;
+    }
   }
   return true;
 }

@@ -92,7 +92,8 @@ struct ElementPlan {
     sinks.clear();
   }
   /// Whether the plan has a property plan per property of `element`, every one names an
-  /// array or sink that exists, and every target lies inside its record.
+  /// array or sink that exists, every target lies inside its record, and no two properties
+  /// share a sink.
   bool fits(const Element& element) const;
   /// Whether some property may go to plyProperty: one to deliver, or a list that another
   /// length sends back to the receiver.

@@ -33,6 +33,7 @@ struct Result {
   ply::ReadResult result{};
   std::map<std::string, std::vector<std::uint32_t>> columns;  // "element/property": stored bits
   std::vector<std::uint32_t> indices;                         // shared by every index list
+  std::map<std::string, std::vector<std::uint32_t>> items;    // "element/property": list items
   std::map<std::string, std::vector<std::uint32_t>> counts;   // per element: list or run counts
   std::vector<std::string> delivered;
   std::vector<std::string> log;
@@ -41,17 +42,25 @@ struct Result {
 };
 
 // The rule: vertex index lists to the index sink (strips with restart markers, faces with
-// their counts, at most 65535 items); other lists of 3 items to a column; every fourth scalar
-// delivered; the first property of an unknown element skipped; the other scalars stored
-// by a conversion that depends on their position.
+// their counts, at most 65535 items); other lists at an odd position to a sink of their own
+// as floats, at an even one, when they have 3 items, to a column; the first property of an
+// unknown element skipped; from the seventeenth property on, scalars in their own type (in
+// a record of two words); before it every fourth scalar delivered, the others stored by a
+// conversion that depends on their position.
 ply::PropertyPlan planFor(const ply::Element& element, std::size_t p) {
   const ply::Property& property = element.properties[p];
   ply::PropertyPlan plan;
   if (property.isList) {
-    plan.kind = property.semantic == ply::PropertySemantic::vertexIndex ? Kind::indices : Kind::valueList;
+    plan.kind = property.semantic == ply::PropertySemantic::vertexIndex ? Kind::indices
+                : p % 2 == 1                                            ? Kind::itemList
+                                                                        : Kind::valueList;
     plan.length = 3;
+    plan.sink = plan.kind == Kind::itemList ? static_cast<std::uint32_t>(1 + p) : 0;
   } else if (p == 0 && element.semantic == ply::ElementSemantic::unknown) {
     plan.kind = Kind::skip;
+  } else if (p >= 16) {
+    plan.kind = Kind::scalar;
+    plan.conversion = ply::Conversion::native;
   } else if (p % 4 == 3) {
     plan.kind = Kind::deliver;
   } else {
@@ -84,6 +93,7 @@ class RuleReceiver {
   bool plyPlan(const ply::Element& element, ply::ElementPlan& plan) {
     if (!m_plans) return false;
     base::append(plan.sinks, sink(element));
+    for (std::size_t p = 0; p < element.properties.size(); ++p) base::append(plan.sinks, itemSink(p));
     for (std::size_t p = 0; p < element.properties.size(); ++p) {
       ply::PropertyPlan property = planFor(element, p);
       if (property.kind == Kind::scalar || property.kind == Kind::valueList) {
@@ -107,10 +117,18 @@ class RuleReceiver {
     const std::size_t p = static_cast<std::size_t>(&property - element.properties.data());
     const ply::PropertyPlan plan = planFor(element, p);
     const ply::ListSink indexSink = sink(element);
-    if (!m_plans && plan.kind == Kind::scalar) {
+    if (!m_plans && plan.kind == Kind::scalar && plan.conversion == ply::Conversion::native) {
+      const std::uint64_t bits = testing_support::nativeBits(values[0], property);
+      cell(p, 2, 0) = static_cast<std::uint32_t>(bits);
+      cell(p, 2, 1) = static_cast<std::uint32_t>(bits >> 32);
+    } else if (!m_plans && plan.kind == Kind::scalar) {
       cell(p, 1, 0) = storedBits(values[0], property, plan.conversion);
     } else if (!m_plans && plan.kind == Kind::indices && values.size() <= indexSink.maxLength) {
       storeIndices(indexSink, values, property);
+    } else if (!m_plans && plan.kind == Kind::itemList && values.size() <= itemSink(p).maxLength) {
+      const ply::ListSink items = itemSink(p);
+      for (const ply::Value& value : values) items.items->push_back(storedBits(value, property, plan.conversion));
+      items.listCounts->push_back(static_cast<std::uint16_t>(values.size()));
     } else if (!m_plans && plan.kind == Kind::valueList && values.size() == plan.length) {
       for (std::size_t k = 0; k < values.size(); ++k) {
         cell(p, 3, k) = storedBits(values[k], property, plan.conversion);
@@ -135,7 +153,10 @@ class RuleReceiver {
     if (m_current) m_report.finish(*m_current);
   }
 
-  static std::size_t width(const ply::PropertyPlan& plan) { return plan.kind == Kind::valueList ? plan.length : 1; }
+  static std::size_t width(const ply::PropertyPlan& plan) {
+    if (plan.kind == Kind::valueList) return plan.length;
+    return plan.conversion == ply::Conversion::native ? 2 : 1;
+  }
 
   std::vector<std::uint32_t>& column(std::size_t p) { return m_result.columns[fmt::format("{}/{}", m_element, p)]; }
 
@@ -156,6 +177,16 @@ class RuleReceiver {
       sink.maxLength = 65535;
       if (element.semantic == ply::ElementSemantic::face) sink.listCounts = &m_listCounts[m_element];
     }
+    return sink;
+  }
+
+  // Property p's lists of values at most 65535 long, with their counts.
+  ply::ListSink itemSink(std::size_t p) {
+    const std::string name = fmt::format("{}/{}", m_element, p);
+    ply::ListSink sink;
+    sink.items = &m_items[name];
+    sink.listCounts = &m_itemCounts[name];
+    sink.maxLength = 65535;
     return sink;
   }
 
@@ -189,6 +220,8 @@ class RuleReceiver {
 
  public:
   base::vector<std::uint32_t> m_indices;
+  std::map<std::string, base::vector<std::uint32_t>> m_items;
+  std::map<std::string, base::vector<std::uint16_t>> m_itemCounts;
   std::map<std::string, base::vector<std::uint16_t>> m_listCounts;
   std::map<std::string, base::vector<std::uint32_t>> m_runCounts;
 };
@@ -202,6 +235,12 @@ Result readWithRule(const std::string& text, Source source, bool plans) {
   result.result = ply::readFile(header, stream, receiver);
   receiver.finish();
   result.indices.assign(receiver.m_indices.begin(), receiver.m_indices.end());
+  for (const auto& [name, items] : receiver.m_items) {
+    if (!items.empty()) result.items[name].assign(items.begin(), items.end());
+  }
+  for (const auto& [name, counts] : receiver.m_itemCounts) {
+    if (!counts.empty()) result.counts[name + " items"].assign(counts.begin(), counts.end());
+  }
   // A plan names its sink's lists before any list arrives: only lists that got counts count.
   for (const auto& [name, counts] : receiver.m_listCounts) {
     if (!counts.empty()) result.counts[name].assign(counts.begin(), counts.end());
@@ -221,6 +260,7 @@ void expectPathsAgree(const std::string& text) {
     EXPECT_EQ(planned.result, reference.result);
     EXPECT_EQ(planned.columns, reference.columns);
     EXPECT_EQ(planned.indices, reference.indices);
+    EXPECT_EQ(planned.items, reference.items);
     EXPECT_EQ(planned.counts, reference.counts);
     EXPECT_EQ(planned.delivered, reference.delivered);
     EXPECT_EQ(planned.log, reference.log);
@@ -290,15 +330,20 @@ TEST(PlyPlan, EveryTypeAndConversionInBothByteOrders) {
   for (bool big : {false, true}) {
     Body body(big);
     for (int i = 0; i < 300; ++i) {
-      body.put<std::int8_t>(static_cast<std::int8_t>(i - 128)).put<std::uint8_t>(static_cast<std::uint8_t>(i));
-      body.put<std::int16_t>(static_cast<std::int16_t>(-i * 100))
-          .put<std::uint16_t>(static_cast<std::uint16_t>(i * 200));
-      body.put<std::int32_t>(-i * 70000).put<std::uint32_t>(4000000000u + i);
-      body.put<float>(i * -0.37f).put<double>(i * 1e300);
+      // Three times every type: the third time each is stored in its own type.
+      for (int copy = 0; copy < 3; ++copy) {
+        body.put<std::int8_t>(static_cast<std::int8_t>(i - 128)).put<std::uint8_t>(static_cast<std::uint8_t>(i));
+        body.put<std::int16_t>(static_cast<std::int16_t>(-i * 100))
+            .put<std::uint16_t>(static_cast<std::uint16_t>(i * 200));
+        body.put<std::int32_t>(-i * 70000).put<std::uint32_t>(4000000000u + i);
+        body.put<float>(i * -0.37f).put<double>(i * 1e300);
+      }
     }
-    const std::string elements =
-        "element vertex 300\nproperty char a\nproperty uchar b\nproperty short c\nproperty ushort d\n"
-        "property int e\nproperty uint f\nproperty float g\nproperty double h\n";
+    std::string elements = "element vertex 300\n";
+    for (int copy = 0; copy < 3; ++copy) {
+      elements += "property char a\nproperty uchar b\nproperty short c\nproperty ushort d\n"
+                  "property int e\nproperty uint f\nproperty float g\nproperty double h\n";
+    }
     expectPathsAgree(binaryFile(big, elements, body.text()));
   }
 }
@@ -317,6 +362,28 @@ TEST(PlyPlan, UniformAndMixedListsWithIndexChecks) {
     const std::string elements =
         "element vertex 6\nproperty float x\nelement face 5000\nproperty list uchar int vertex_indices\n"
         "property float quality\nproperty ushort tag\n";
+    expectPathsAgree(binaryFile(big, elements, body.text()));
+  }
+}
+
+TEST(PlyPlan, SeveralListsRunTogetherUntilAnyLengthChanges) {
+  for (bool big : {false, true}) {
+    Body body(big);
+    for (int i = 0; i < 6; ++i) body.put<float>(static_cast<float>(i));
+    // Triangles with six values each; a run where only the values' length changes; quads.
+    for (int f = 0; f < 3000; ++f) {
+      const int corners = f >= 2000 ? 4 : 3;
+      const int values = f >= 1000 && f < 1500 ? 4 : 2 * corners;
+      body.put<std::uint8_t>(static_cast<std::uint8_t>(corners));
+      for (int k = 0; k < corners; ++k) body.put<std::int32_t>((f + k) % 6);
+      body.put<std::uint8_t>(static_cast<std::uint8_t>(values));
+      for (int k = 0; k < values; ++k) body.put<float>(static_cast<float>(f) + 0.25f * static_cast<float>(k));
+      body.put<std::uint16_t>(static_cast<std::uint16_t>(f));
+      body.put<std::uint8_t>(3).put<std::int16_t>(static_cast<std::int16_t>(f)).put<std::int16_t>(-1).put<std::int16_t>(7);
+    }
+    const std::string elements =
+        "element vertex 6\nproperty float x\nelement face 3000\nproperty list uchar int vertex_indices\n"
+        "property list uchar float texcoord\nproperty ushort tag\nproperty list uchar short three\n";
     expectPathsAgree(binaryFile(big, elements, body.text()));
   }
 }
@@ -365,7 +432,7 @@ TEST(PlyPlan, AsciiElementsWithCommentsBadWordsAndAnEarlyEnd) {
   expectPathsAgree(file);
 }
 
-TEST(PlyPlan, APlanWithTargetsOutsideItsRecordsIsRefused) {
+TEST(PlyPlan, APlanThatCannotBeFollowedIsRefused) {
   struct Misplanned {
     bool plyElement(const ply::Element&) { return true; }
     void beginInstance(std::uint32_t) {}
@@ -376,15 +443,30 @@ TEST(PlyPlan, APlanWithTargetsOutsideItsRecordsIsRefused) {
                                                    return reinterpret_cast<std::byte*>(floats.data());
                                                  },
                                                  4});
-      base::append(plan.properties, ply::PropertyPlan{ply::PropertyPlan::Kind::scalar, ply::Conversion::toFloat, 0, 4});
+      base::append(plan.sinks, ply::ListSink{&items});
+      for (const ply::PropertyPlan& property : properties) base::append(plan.properties, property);
       return true;
     }
+    std::vector<ply::PropertyPlan> properties;
     std::vector<float> floats;
-  } receiver;
-  const std::string file = "ply\nformat ascii 1.0\nelement vertex 1\nproperty float x\nend_header\n1\n";
-  base::Stream stream = testing_support::sourceStream(file, Source::memory);
-  ply::Header header;
-  EXPECT_THROW(ply::readFile(header, stream, receiver), base::invalid_argument);
+    base::vector<std::uint32_t> items;
+  };
+  const ply::PropertyPlan outside{Kind::scalar, ply::Conversion::toFloat, 0, 4};
+  const ply::PropertyPlan doubleInFourBytes{Kind::scalar, ply::Conversion::native, 0, 0};
+  const ply::PropertyPlan floats{Kind::itemList, ply::Conversion::toFloat};
+  const ply::PropertyPlan indicesAsItems{Kind::itemList, ply::Conversion::toIndex};
+  // Two lists into one sink could not keep each instance's lists together in a run.
+  for (const auto& properties : std::vector<std::vector<ply::PropertyPlan>>{
+           {outside, floats, {}}, {doubleInFourBytes, floats, {}}, {{}, floats, floats}, {{}, indicesAsItems, {}}}) {
+    Misplanned receiver;
+    receiver.properties = properties;
+    const std::string file =
+        "ply\nformat ascii 1.0\nelement vertex 1\nproperty double x\nproperty list uchar float a\n"
+        "property list uchar float b\nend_header\n1 1 1 1 1\n";
+    base::Stream stream = testing_support::sourceStream(file, Source::memory);
+    ply::Header header;
+    EXPECT_THROW(ply::readFile(header, stream, receiver), base::invalid_argument);
+  }
 }
 
 TEST(PlyPlan, HostileCountOverAPipeAllocatesOnlyWhatArrives) {
