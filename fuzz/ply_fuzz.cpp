@@ -22,13 +22,16 @@ using testing_support::storedBits;
 constexpr std::uint32_t longestPlannedList = 65535;
 
 // What one element read: every scalar as the 32-bit pattern its conversion gives (a record
-// of one slot per property), index lists and their lengths, and lists of three floats per
-// list property. Lists the plan leaves to the receiver are kept with their instance.
+// of one slot per property), index lists and their lengths, lists of three floats per list
+// property at an even position, and at an odd one all its lists' floats with their lengths.
+// Lists the plan leaves to the receiver are kept with their instance.
 struct ElementValues {
   std::vector<std::uint32_t> scalars;
   base::vector<std::uint32_t> indices;
   base::vector<std::uint16_t> counts;
   std::vector<std::vector<std::uint32_t>> triples;  // float bit patterns: NaN equals itself
+  std::vector<base::vector<std::uint32_t>> items;
+  std::vector<base::vector<std::uint16_t>> itemCounts;
   std::vector<std::vector<std::uint32_t>> delivered;
 
   bool operator==(const ElementValues&) const = default;
@@ -47,8 +50,16 @@ struct ElementValues {
   }
 };
 
-// The conversion a scalar gets depends on its position, so that each is exercised.
-ply::Conversion conversionOf(std::size_t property) { return static_cast<ply::Conversion>(property % 3); }
+// The conversion a scalar gets depends on its position, so that each is exercised; a value
+// in its own type must fit the 4-byte slot.
+ply::Conversion conversionOf(std::size_t p, const ply::Property& property) {
+  if (p % 5 == 4 && ply::dataTypeSize(property.type) <= 4) return ply::Conversion::native;
+  return static_cast<ply::Conversion>(p % 3);
+}
+
+bool isItemList(std::size_t p, const ply::Property& property) {
+  return property.isList && property.semantic != ply::PropertySemantic::vertexIndex && p % 2 == 1;
+}
 
 // Receives every value one by one and stores it where the plan below would.
 struct Delivered {
@@ -56,7 +67,10 @@ struct Delivered {
   std::uint32_t instance = 0;
 
   bool plyElement(const ply::Element& element) {
-    elements.emplace_back().triples.resize(element.properties.size());
+    ElementValues& values = elements.emplace_back();
+    values.triples.resize(element.properties.size());
+    values.items.resize(element.properties.size());
+    values.itemCounts.resize(element.properties.size());
     return true;
   }
   void beginInstance(std::uint32_t index) { instance = index; }
@@ -64,7 +78,11 @@ struct Delivered {
     const auto p = static_cast<std::size_t>(&property - element.properties.data());
     ElementValues& target = elements.back();
     if (!property.isList) {
-      store(target, element, p, storedBits(values[0], property, conversionOf(p)));
+      store(target, element, p, storedBits(values[0], property, conversionOf(p, property)));
+    } else if (isItemList(p, property) && values.size() <= longestPlannedList) {
+      for (const ply::Value& value : values)
+        base::append(target.items[p], storedBits(value, property, ply::Conversion::toFloat));
+      base::append(target.itemCounts[p], static_cast<std::uint16_t>(values.size()));
     } else if (property.semantic == ply::PropertySemantic::vertexIndex && values.size() <= longestPlannedList) {
       for (const ply::Value& value : values)
         base::append(target.indices, storedBits(value, property, ply::Conversion::toIndex));
@@ -94,8 +112,9 @@ struct Delivered {
   }
 };
 
-// Plans every property: scalars to one record, index lists to a sink, other lists of three
-// to an array of their own; the rest comes through plyProperty as above.
+// Plans every property: scalars to one record, index lists to a sink, other lists to a sink
+// of their own or, of three, to an array of their own; the rest comes through plyProperty as
+// above.
 struct Planned : Delivered {
   bool plyPlan(const ply::Element& element, ply::ElementPlan& plan) {
     const auto width = static_cast<std::uint32_t>(element.properties.size());
@@ -107,6 +126,10 @@ struct Planned : Delivered {
                                                4 * width});
     base::append(plan.sinks, ply::ListSink{&target.indices, ply::ListSink::noRangeCheck, &target.counts, nullptr,
                                             longestPlannedList});
+    for (std::uint32_t p = 0; p < width; ++p) {
+      base::append(plan.sinks, ply::ListSink{&target.items[p], ply::ListSink::noRangeCheck, &target.itemCounts[p],
+                                              nullptr, longestPlannedList});
+    }
     for (std::uint32_t p = 0; p < width; ++p) base::append(plan.properties, planOf(element, p, target, plan));
     return true;
   }
@@ -117,9 +140,12 @@ struct Planned : Delivered {
     const ply::Property& property = element.properties[p];
     ply::PropertyPlan result;
     if (!property.isList) {
-      result = {ply::PropertyPlan::Kind::scalar, conversionOf(p), 0, 4 * p};
+      result = {ply::PropertyPlan::Kind::scalar, conversionOf(p, property), 0, 4 * p};
     } else if (property.semantic == ply::PropertySemantic::vertexIndex) {
       result.kind = ply::PropertyPlan::Kind::indices;
+    } else if (isItemList(p, property)) {
+      result = {ply::PropertyPlan::Kind::itemList, ply::Conversion::toFloat};
+      result.sink = 1 + p;
     } else {
       std::vector<std::uint32_t>& triples = target.triples[p];
       result = {ply::PropertyPlan::Kind::valueList, ply::Conversion::toFloat,
