@@ -16,6 +16,8 @@ namespace {
 constexpr int meshVertices = 1'000'000;
 constexpr int meshTriangles = 2'000'000;
 constexpr int cloudPoints = 2'000'000;
+constexpr int splatPoints = 1'000'000;
+constexpr int splatFields = 62;
 
 using File = std::unique_ptr<std::FILE, int (*)(std::FILE*)>;
 
@@ -79,13 +81,17 @@ class Writer {
   std::string m_line;
 };
 
-void writeMesh(std::FILE* file, Encoding encoding) {
+void writeCloud(std::FILE* file, Encoding encoding);
+
+// The mesh; with `texcoords` its faces carry a texcoord list of six floats as well.
+void writeMesh(std::FILE* file, Encoding encoding, bool texcoords) {
   fmt::print(file,
              "ply\nformat {} 1.0\ncomment benchmark mesh\nelement vertex {}\nproperty float x\nproperty float y\n"
              "property float z\nproperty float nx\nproperty float ny\nproperty float nz\nproperty uchar red\n"
              "property uchar green\nproperty uchar blue\nproperty uchar alpha\nproperty float u\nproperty float v\n"
-             "element face {}\nproperty list uchar int vertex_indices\nend_header\n",
-             formatWord(encoding), meshVertices, meshTriangles);
+             "element face {}\nproperty list uchar int vertex_indices\n{}end_header\n",
+             formatWord(encoding), meshVertices, meshTriangles,
+             texcoords ? "property list uchar float texcoord\n" : "");
   Writer out(file, encoding);
   for (int i = 0; i < meshVertices; ++i) {
     const float t = static_cast<float>(i) * 0.001f;
@@ -98,7 +104,55 @@ void writeMesh(std::FILE* file, Encoding encoding) {
   for (int f = 0; f < meshTriangles; ++f) {
     out.integer(3, 1);
     for (std::uint32_t index : meshFace(f)) out.integer(index, 4, true);
+    if (texcoords) {
+      out.integer(6, 1);
+      for (int k = 0; k < 6; ++k) out.real(static_cast<float>((f + k) % 1024) / 1024.0f);
+    }
     out.endLine();
+  }
+}
+
+// A Gaussian-splat cloud: positions, normals, 48 colour coefficients, opacity, scale and
+// rotation, 62 floats a point.
+void writeSplat(std::FILE* file, Encoding encoding) {
+  std::string header = fmt::format("ply\nformat {} 1.0\nelement vertex {}\n", formatWord(encoding), splatPoints);
+  for (const char* name : {"x", "y", "z", "nx", "ny", "nz"}) header += fmt::format("property float {}\n", name);
+  for (int k = 0; k < 3; ++k) header += fmt::format("property float f_dc_{}\n", k);
+  for (int k = 0; k < 45; ++k) header += fmt::format("property float f_rest_{}\n", k);
+  header += "property float opacity\n";
+  for (int k = 0; k < 3; ++k) header += fmt::format("property float scale_{}\n", k);
+  for (int k = 0; k < 4; ++k) header += fmt::format("property float rot_{}\n", k);
+  std::fputs((header + "end_header\n").c_str(), file);
+  Writer out(file, encoding);
+  for (int i = 0; i < splatPoints; ++i) {
+    for (int k = 0; k < splatFields; ++k) out.real(static_cast<float>((i * 31 + k * 7) % 4096) / 512.0f - 4.0f);
+    out.endLine();
+  }
+}
+
+const char* shapeName(Shape shape) {
+  switch (shape) {
+    case Shape::mesh:
+      return "mesh";
+    case Shape::cloud:
+      return "cloud";
+    case Shape::texcoordMesh:
+      return "texcoord_mesh";
+    case Shape::splat:
+      return "splat";
+  }
+  return "";
+}
+
+void writeShape(std::FILE* file, Shape shape, Encoding encoding) {
+  switch (shape) {
+    case Shape::mesh:
+    case Shape::texcoordMesh:
+      return writeMesh(file, encoding, shape == Shape::texcoordMesh);
+    case Shape::cloud:
+      return writeCloud(file, encoding);
+    case Shape::splat:
+      return writeSplat(file, encoding);
   }
 }
 
@@ -121,14 +175,14 @@ void writeCloud(std::FILE* file, Encoding encoding) {
 std::string plyFile(Shape shape, Encoding encoding) {
   const std::filesystem::path folder = std::filesystem::temp_directory_path() / "meshport-bench";
   std::filesystem::create_directories(folder);
-  const std::string name = fmt::format("{}_{}_9g.ply", shape == Shape::mesh ? "mesh" : "cloud", formatWord(encoding));
+  const std::string name = fmt::format("{}_{}_9g.ply", shapeName(shape), formatWord(encoding));
   const std::filesystem::path path = folder / name;
   if (std::filesystem::exists(path)) return path.string();
   const std::filesystem::path partial = folder / (name + ".partial");
   {
     File file(std::fopen(partial.string().c_str(), "wb"), &std::fclose);
     if (!file) throw std::runtime_error("cannot write " + partial.string());
-    shape == Shape::mesh ? writeMesh(file.get(), encoding) : writeCloud(file.get(), encoding);
+    writeShape(file.get(), shape, encoding);
   }
   // Renamed only when complete, so an interrupted run never leaves a short file behind.
   std::filesystem::rename(partial, path);

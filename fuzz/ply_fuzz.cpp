@@ -125,10 +125,10 @@ struct Planned : Delivered {
                                                },
                                                4 * width});
     base::append(plan.sinks, ply::ListSink{&target.indices, ply::ListSink::noRangeCheck, &target.counts, nullptr,
-                                            longestPlannedList});
+                                           longestPlannedList});
     for (std::uint32_t p = 0; p < width; ++p) {
       base::append(plan.sinks, ply::ListSink{&target.items[p], ply::ListSink::noRangeCheck, &target.itemCounts[p],
-                                              nullptr, longestPlannedList});
+                                             nullptr, longestPlannedList});
     }
     for (std::uint32_t p = 0; p < width; ++p) base::append(plan.properties, planOf(element, p, target, plan));
     return true;

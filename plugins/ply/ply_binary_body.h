@@ -178,9 +178,11 @@ class BinaryBody {
     PlanTargets targets(m_plan, element.count, m_window.remaining().has_value());
     const bool delivers = m_plan.delivers();
     if (layout.recordSize > 0) return readPlannedRecords(element, layout, targets, delivers, receiver);
-    // Runs of equal lists go in bulk when the plan stores or skips everything.
+    // Runs of equal lists go in bulk when the plan stores or skips everything and no two
+    // lists share a sink.
     m_runCounts.assign(m_steps.size(), 0);
-    const bool uniform = std::any_of(element.properties.begin(), element.properties.end(),
+    const bool uniform = !m_plan.sharesSinks() &&
+                         std::any_of(element.properties.begin(), element.properties.end(),
                                      [](const Property& property) { return property.isList; }) &&
                          std::none_of(m_plan.properties.begin(), m_plan.properties.end(), [](const PropertyPlan& plan) {
                            return plan.kind == PropertyPlan::Kind::deliver;

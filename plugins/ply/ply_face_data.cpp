@@ -122,7 +122,9 @@ void PLYImporter::finishFaceUVs(std::uint32_t start, std::uint32_t corners) {
                         std::equal(faces.begin(), faces.end(), m_faceItemCounts.begin(),
                                    [](std::uint16_t n, std::uint16_t items) { return 2u * n == items; });
   if (matching) {
-    std::memcpy(static_cast<void*>(uvs.data()), m_faceItems.data(), m_faceItems.size() * sizeof(std::uint32_t));
+    if (!m_faceItems.empty()) {
+      std::memcpy(static_cast<void*>(uvs.data()), m_faceItems.data(), m_faceItems.size() * sizeof(std::uint32_t));
+    }
   } else {
     // Each face takes the pairs its list has for its corners; missing ones read (0, 0).
     std::size_t item = 0, corner = 0, mismatched = 0;
@@ -130,7 +132,8 @@ void PLYImporter::finishFaceUVs(std::uint32_t start, std::uint32_t corners) {
       const std::size_t items = f < m_faceItemCounts.size() ? m_faceItemCounts[f] : 0;
       const std::size_t pairs =
           std::min<std::size_t>({faces[f], items / 2, corners - std::min<std::size_t>(corner, corners)});
-      std::memcpy(static_cast<void*>(uvs.data() + corner), m_faceItems.data() + item, pairs * sizeof(UV));
+      if (pairs > 0)
+        std::memcpy(static_cast<void*>(uvs.data() + corner), m_faceItems.data() + item, pairs * sizeof(UV));
       if (items != 2u * faces[f]) ++mismatched;
       item += items;
       corner += faces[f];

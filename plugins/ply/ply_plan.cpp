@@ -7,6 +7,16 @@
 
 namespace ply {
 
+bool ElementPlan::sharesSinks() const {
+  base::vector<bool> taken(sinks.size(), false);
+  for (const PropertyPlan& property : properties) {
+    if (!property.toSink()) continue;
+    if (taken[property.sink]) return true;
+    taken[property.sink] = true;
+  }
+  return false;
+}
+
 bool ElementPlan::delivers() const {
   return std::any_of(properties.begin(), properties.end(), [](const PropertyPlan& property) {
     return property.kind != PropertyPlan::Kind::scalar && property.kind != PropertyPlan::Kind::skip;
@@ -45,14 +55,8 @@ bool fitsOne(const ElementPlan& plan, const Property& property, const PropertyPl
 
 bool ElementPlan::fits(const Element& element) const {
   if (properties.size() != element.properties.size()) return false;
-  // A run of instances goes into each sink list by list, so one sink serves one property.
-  base::vector<bool> taken(sinks.size(), false);
   for (std::size_t p = 0; p < properties.size(); ++p) {
     if (!fitsOne(*this, element.properties[p], properties[p])) return false;
-    if (properties[p].toSink()) {
-      if (taken[properties[p].sink]) return false;
-      taken[properties[p].sink] = true;
-    }
   }
   return true;
 }

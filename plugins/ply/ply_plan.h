@@ -92,12 +92,14 @@ struct ElementPlan {
     sinks.clear();
   }
   /// Whether the plan has a property plan per property of `element`, every one names an
-  /// array or sink that exists, every target lies inside its record, and no two properties
-  /// share a sink.
+  /// array or sink that exists, and every target lies inside its record.
   bool fits(const Element& element) const;
   /// Whether some property may go to plyProperty: one to deliver, or a list that another
   /// length sends back to the receiver.
   bool delivers() const;
+  /// Whether two properties send their lists to one sink (each instance's lists must then
+  /// arrive one after the other, never a run of one property's lists at once).
+  bool sharesSinks() const;
 };
 
 /// Reports indices that are not below the vertex count: the first few with their own line

@@ -341,8 +341,9 @@ TEST(PlyPlan, EveryTypeAndConversionInBothByteOrders) {
     }
     std::string elements = "element vertex 300\n";
     for (int copy = 0; copy < 3; ++copy) {
-      elements += "property char a\nproperty uchar b\nproperty short c\nproperty ushort d\n"
-                  "property int e\nproperty uint f\nproperty float g\nproperty double h\n";
+      elements +=
+          "property char a\nproperty uchar b\nproperty short c\nproperty ushort d\n"
+          "property int e\nproperty uint f\nproperty float g\nproperty double h\n";
     }
     expectPathsAgree(binaryFile(big, elements, body.text()));
   }
@@ -379,11 +380,31 @@ TEST(PlyPlan, SeveralListsRunTogetherUntilAnyLengthChanges) {
       body.put<std::uint8_t>(static_cast<std::uint8_t>(values));
       for (int k = 0; k < values; ++k) body.put<float>(static_cast<float>(f) + 0.25f * static_cast<float>(k));
       body.put<std::uint16_t>(static_cast<std::uint16_t>(f));
-      body.put<std::uint8_t>(3).put<std::int16_t>(static_cast<std::int16_t>(f)).put<std::int16_t>(-1).put<std::int16_t>(7);
+      body.put<std::uint8_t>(3)
+          .put<std::int16_t>(static_cast<std::int16_t>(f))
+          .put<std::int16_t>(-1)
+          .put<std::int16_t>(7);
     }
     const std::string elements =
         "element vertex 6\nproperty float x\nelement face 3000\nproperty list uchar int vertex_indices\n"
         "property list uchar float texcoord\nproperty ushort tag\nproperty list uchar short three\n";
+    expectPathsAgree(binaryFile(big, elements, body.text()));
+  }
+}
+
+TEST(PlyPlan, TwoIndexListsOfOneElementKeepEachInstanceTogether) {
+  for (bool big : {false, true}) {
+    Body body(big);
+    for (int i = 0; i < 4; ++i) body.put<float>(static_cast<float>(i));
+    for (int f = 0; f < 2000; ++f) {
+      for (int list = 0; list < 2; ++list) {
+        body.put<std::uint8_t>(3);
+        for (int k = 0; k < 3; ++k) body.put<std::int32_t>((f + k + list) % 4);
+      }
+    }
+    const std::string elements =
+        "element vertex 4\nproperty float x\nelement face 2000\nproperty list uchar int vertex_indices\n"
+        "property list uchar int vertex_indices\n";
     expectPathsAgree(binaryFile(big, elements, body.text()));
   }
 }
@@ -455,9 +476,8 @@ TEST(PlyPlan, APlanThatCannotBeFollowedIsRefused) {
   const ply::PropertyPlan doubleInFourBytes{Kind::scalar, ply::Conversion::native, 0, 0};
   const ply::PropertyPlan floats{Kind::itemList, ply::Conversion::toFloat};
   const ply::PropertyPlan indicesAsItems{Kind::itemList, ply::Conversion::toIndex};
-  // Two lists into one sink could not keep each instance's lists together in a run.
   for (const auto& properties : std::vector<std::vector<ply::PropertyPlan>>{
-           {outside, floats, {}}, {doubleInFourBytes, floats, {}}, {{}, floats, floats}, {{}, indicesAsItems, {}}}) {
+           {outside, floats, {}}, {doubleInFourBytes, floats, {}}, {{}, indicesAsItems, {}}}) {
     Misplanned receiver;
     receiver.properties = properties;
     const std::string file =
