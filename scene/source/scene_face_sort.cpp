@@ -129,6 +129,113 @@ void sortUniform(std::uint32_t* channel, std::uint32_t count, FaceSortScratch& s
   if (!placeAndSort(records, faces, std::less<Record>(), scratch)) std::sort(records, records + faces);
 }
 
+// mergeFewOutOfOrder for faces of N indices in several channels. The moves are worked out on
+// the first channel before anything moves (which faces are lifted, and for each place of
+// the result whether it takes a lifted face or the next kept one), then made in every
+// channel alike: only the lifted faces are copied. False, with nothing moved, when more than
+// one face in 64 is out of order.
+template <std::size_t N>
+bool mergeFewOutOfOrderChannels(std::span<std::uint32_t* const> channels, std::size_t faces, FaceSortScratch& scratch) {
+  using Face = std::array<std::uint32_t, N>;
+  using Record = std::array<std::uint32_t, N + 1>;  // a lifted face's indices, then its place
+  const auto* keys = reinterpret_cast<const Face*>(channels[0]);
+  const std::size_t allowed = faces / 64 + 16;
+  base::vector<std::uint32_t>& liftedAt = scratch.next;  // ascending
+  liftedAt.clear();
+  for (std::size_t i = 1, kept = 0; i < faces; ++i) {
+    if (!(keys[i] < keys[kept])) {
+      kept = i;
+    } else if (liftedAt.size() == allowed) {
+      return false;
+    } else {
+      base::append(liftedAt, static_cast<std::uint32_t>(i));
+    }
+  }
+  const std::size_t taken = liftedAt.size();
+  if (taken == 0) return true;
+  scratch.records.resize(taken * (N + 1));
+  auto* lifted = reinterpret_cast<Record*>(scratch.records.data());
+  for (std::size_t k = 0; k < taken; ++k) {
+    std::copy(keys[liftedAt[k]].begin(), keys[liftedAt[k]].end(), lifted[k].begin());
+    lifted[k][N] = liftedAt[k];
+  }
+  std::sort(lifted, lifted + taken);
+  const auto liftedLess = [](const Record& record, const Face& face) {
+    return std::lexicographical_compare(record.begin(), record.begin() + N, face.begin(), face.end());
+  };
+  // The merge from the last place back, as mergeFewOutOfOrder makes it.
+  base::vector<std::uint8_t>& fromLifted = scratch.flags;
+  fromLifted.assign(faces, 0);
+  std::size_t original = faces, skip = taken;
+  const auto previousKept = [&] {
+    while (original > 0) {
+      --original;
+      if (skip > 0 && liftedAt[skip - 1] == original) {
+        --skip;
+        continue;
+      }
+      return true;
+    }
+    return false;
+  };
+  bool haveKept = previousKept();
+  for (std::size_t out = faces, t = taken; out-- > 0 && t > 0;) {
+    if (haveKept && liftedLess(lifted[t - 1], keys[original])) {
+      haveKept = previousKept();
+    } else {
+      fromLifted[out] = 1;
+      --t;
+    }
+  }
+  scratch.indices.resize(taken * N);
+  for (std::uint32_t* channel : channels) {
+    auto* face = reinterpret_cast<Face*>(channel);
+    auto* liftedFaces = reinterpret_cast<Face*>(scratch.indices.data());
+    for (std::size_t k = 0; k < taken; ++k) liftedFaces[k] = face[lifted[k][N]];
+    std::size_t kept = 0;
+    for (std::size_t i = 0, s = 0; i < faces; ++i) {
+      if (s < taken && liftedAt[s] == i) {
+        ++s;
+      } else {
+        face[kept++] = face[i];
+      }
+    }
+    for (std::size_t out = faces, t = taken; out-- > 0 && t > 0;)
+      face[out] = fromLifted[out] ? liftedFaces[--t] : face[--kept];
+  }
+  return true;
+}
+
+// Faces of N indices each in several channels: in order but for a few, they are merged in
+// place; otherwise the first channel's faces, each with its number, are sorted as records
+// (ties keep the file's order), the first channel takes their indices and the other
+// channels are gathered by the numbers.
+template <std::size_t N>
+void sortUniformChannels(std::span<std::uint32_t* const> channels, std::uint32_t count, FaceSortScratch& scratch) {
+  using Face = std::array<std::uint32_t, N>;
+  using Record = std::array<std::uint32_t, N + 1>;
+  const std::size_t faces = count / N;
+  const auto* keys = reinterpret_cast<const Face*>(channels[0]);
+  if (faces < 2 || mergeFewOutOfOrderChannels<N>(channels, faces, scratch)) return;
+  scratch.records.resize(faces * (N + 1));
+  auto* records = reinterpret_cast<Record*>(scratch.records.data());
+  for (std::size_t f = 0; f < faces; ++f) {
+    std::copy(keys[f].begin(), keys[f].end(), records[f].begin());
+    records[f][N] = static_cast<std::uint32_t>(f);
+  }
+  if (!placeAndSort(records, faces, std::less<Record>(), scratch)) {
+    std::sort(records, records + faces);
+  }
+  for (std::size_t f = 0; f < faces; ++f) std::copy_n(records[f].begin(), N, channels[0] + f * N);
+  scratch.indices.resize(count);
+  for (std::uint32_t* channel : channels.subspan(1)) {
+    std::copy(channel, channel + count, scratch.indices.begin());
+    for (std::size_t f = 0; f < faces; ++f) {
+      std::copy_n(scratch.indices.begin() + std::size_t(records[f][N]) * N, N, channel + f * N);
+    }
+  }
+}
+
 std::array<std::uint32_t, 4> sortKey(const std::uint32_t* f, std::uint32_t n) {
   return {f[0], n > 1 ? f[1] : absent, n > 2 ? f[2] : absent, n > 3 ? f[3] : absent};
 }
@@ -171,6 +278,11 @@ void sortFaces(std::span<std::uint32_t* const> channels, std::uint32_t count, st
     if (uniformCount == 2) return sortUniform<2>(channels[0], count, scratch);
     if (uniformCount == 3) return sortUniform<3>(channels[0], count, scratch);
     if (uniformCount == 4) return sortUniform<4>(channels[0], count, scratch);
+  }
+  if (faceCounts.empty()) {
+    if (uniformCount == 2) return sortUniformChannels<2>(channels, count, scratch);
+    if (uniformCount == 3) return sortUniformChannels<3>(channels, count, scratch);
+    if (uniformCount == 4) return sortUniformChannels<4>(channels, count, scratch);
   }
   sortRecords(channels, count, faceCounts, uniformCount, scratch);
 }

@@ -37,11 +37,14 @@ struct FaceRecord {
 
 /// Memory that the encoding reuses from one range of a mesh to the next: the table of runs
 /// per first index, the face records and the copy of a channel that the general case needs
-/// (uniform single-channel ranges are sorted in place and need neither).
+/// (uniform single-channel ranges are sorted in place and need neither; uniform ranges of
+/// several channels sort their first channel's faces with their numbers in `records`).
 struct FaceSortScratch {
   base::vector<std::uint32_t> starts;
   base::vector<std::uint32_t> next;
   base::vector<std::uint32_t> indices;
+  base::vector<std::uint32_t> records;
+  base::vector<std::uint8_t> flags;
   base::vector<FaceRecord> faces;
   base::vector<FaceRecord> sorted;
 };

@@ -29,20 +29,30 @@ std::uint32_t startCorner(const std::uint32_t* f, std::uint32_t n) {
   return static_cast<std::uint32_t>(std::min_element(f, f + n) - f);
 }
 
-// One channel of faces of N indices: the same rotation in a loop the compiler sees through.
+// Faces of N indices: the same rotation in a loop the compiler sees through, with a loop of
+// its own for a single channel.
 template <std::uint32_t N>
-void rotateUniform(std::uint32_t* channel, std::uint32_t count) {
-  for (std::uint32_t* f = channel; f + N <= channel + count; f += N) {
-    if (const std::uint32_t start = startCorner(f, N)) std::rotate(f, f + start, f + N);
+void rotateUniform(std::span<std::uint32_t* const> channels, std::uint32_t count) {
+  if (channels.size() == 1) {
+    std::uint32_t* channel = channels[0];
+    for (std::uint32_t* f = channel; f + N <= channel + count; f += N) {
+      if (const std::uint32_t start = startCorner(f, N)) std::rotate(f, f + start, f + N);
+    }
+    return;
+  }
+  for (std::uint32_t offset = 0; offset + N <= count; offset += N) {
+    const std::uint32_t start = startCorner(channels[0] + offset, N);
+    if (start == 0) continue;
+    for (std::uint32_t* channel : channels) std::rotate(channel + offset, channel + offset + start, channel + offset + N);
   }
 }
 
 void rotateFaces(std::span<std::uint32_t* const> channels, std::uint32_t count,
                  std::span<const std::uint16_t> faceCounts, std::uint32_t uniformCount) {
-  if (faceCounts.empty() && channels.size() == 1) {
-    if (uniformCount == 2) return rotateUniform<2>(channels[0], count);
-    if (uniformCount == 3) return rotateUniform<3>(channels[0], count);
-    if (uniformCount == 4) return rotateUniform<4>(channels[0], count);
+  if (faceCounts.empty()) {
+    if (uniformCount == 2) return rotateUniform<2>(channels, count);
+    if (uniformCount == 3) return rotateUniform<3>(channels, count);
+    if (uniformCount == 4) return rotateUniform<4>(channels, count);
   }
   detail::forEachFace(count, faceCounts, uniformCount, [&](std::uint32_t offset, std::uint32_t n) {
     if (n == 2) {
