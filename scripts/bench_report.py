@@ -91,6 +91,8 @@ def reader_table(runs):
     for key, title, name in FILES:
         size = (bench_folder() / name).stat().st_size / 1e6
         columns = get(runs, f"BM_PlyColumns/{key}")
+        if columns is None:
+            continue
         floor = get(runs, f"BM_FloorSplit/{key}" if key.endswith("ascii") else f"BM_FloorReadTouch/{key}")
         rows.append(f"| {title} | {size:.0f} MB | {ms(columns)} | {ms(get(runs, f'BM_PlyParse/{key}'))} | "
                     f"{ms(get(runs, f'BM_FloorReadTouch/{key}'))} | {ms(get(runs, f'BM_FloorSplit/{key}'))} | "

@@ -11,6 +11,7 @@
 #include <algorithm>
 #include <bit>
 #include <cstring>
+#include <ranges>
 
 namespace ply {
 namespace {
@@ -99,12 +100,11 @@ void PLYImporter::finishFaceData() {
       m_faceColourSet->attribute<base::vector<base::base_vec3<float>>>(meshColorSet_schema::RGB()).resize(faces);
     }
     base::vector<std::uint32_t>& channel = newFaceChannel(*m_faceColourSet, start, corners);
-    std::size_t corner = start;
-    for (std::uint32_t f = 0; f < faces && corner < channel.size(); ++f) {
-      const std::size_t n = std::min<std::size_t>((*m_vcountsList)[f], channel.size() - corner);
-      std::fill_n(channel.begin() + corner, n, f);
-      corner += n;
+    const std::size_t end = std::size_t(start) + corners;
+    for (std::uint32_t f = 0; f < faces && channel.size() < end; ++f) {
+      channel.insert(channel.end(), std::min<std::size_t>((*m_vcountsList)[f], end - channel.size()), f);
     }
+    channel.resize(end, invalidIndex);
   }
   if (m_faceUVSet) finishFaceUVs(start, corners);
   m_faceColourSet = nullptr;
@@ -114,13 +114,14 @@ void PLYImporter::finishFaceData() {
 void PLYImporter::finishFaceUVs(std::uint32_t start, std::uint32_t corners) {
   using UV = base::base_vec2<float>;
   base::vector<UV>& uvs = m_faceUVSet->attribute<base::vector<UV>>(meshUVSet_schema::UV(), base::vector<UV>());
-  uvs.resize(corners);
   base::vector<std::uint32_t>& channel = newFaceChannel(*m_faceUVSet, start, corners);
-  for (std::uint32_t k = 0; k < corners; ++k) channel[start + k] = k;
+  const auto serial = std::views::iota(0u, corners);
+  channel.insert(channel.end(), serial.begin(), serial.end());
   const base::vector<std::uint16_t>& faces = *m_vcountsList;
   const bool matching = m_faceItemCounts.size() == faces.size() && m_faceItems.size() == 2 * std::size_t(corners) &&
                         std::equal(faces.begin(), faces.end(), m_faceItemCounts.begin(),
                                    [](std::uint16_t n, std::uint16_t items) { return 2u * n == items; });
+  uvs.resize(corners);
   if (matching) {
     if (!m_faceItems.empty()) {
       std::memcpy(static_cast<void*>(uvs.data()), m_faceItems.data(), m_faceItems.size() * sizeof(std::uint32_t));
@@ -152,7 +153,9 @@ base::vector<std::uint32_t>& PLYImporter::newFaceChannel(base::AttribMap& set, s
   set.attribute<std::uint32_t>(meshUVSet_schema::invalidIndex(), invalidIndex);
   base::vector<std::uint32_t>& channel =
       set.attribute<base::vector<std::uint32_t>>(meshUVSet_schema::indices(), base::vector<std::uint32_t>());
-  channel.assign(std::size_t(start) + corners, invalidIndex);
+  // The corners before the set's own range; the caller appends the range's.
+  channel.reserve(std::size_t(start) + corners);
+  channel.assign(start, invalidIndex);
   base::append(m_faceChannels, &channel);
   return channel;
 }

@@ -26,13 +26,19 @@ std::string fileBytes(const std::string& path) {
   return bytes.str();
 }
 
-const char* const files[] = {"binary_le_cube_triangles.ply", "binary_be_tristrips_material.ply",
-                             "ascii_quad_two_uv_sets.ply"};
+// Files of this repository and of other tools (a scanner's big-endian cloud with texture_u/v,
+// a mesh with per-face texcoord lists).
+const char* const files[] = {MESHPORT_TEST_DATA "/ply/valid/binary_le_cube_triangles.ply",
+                             MESHPORT_TEST_DATA "/ply/valid/binary_be_tristrips_material.ply",
+                             MESHPORT_TEST_DATA "/ply/valid/ascii_face_texcoords_colors.ply",
+                             MESHPORT_CORPUS "/files/here__halfcone_big_endian.ply",
+                             MESHPORT_CORPUS "/files/loadersgl__cube_att.ply"};
 
 TEST(GzipImport, AGzippedFileImportsAsTheFileItHolds) {
-  for (const char* name : files) {
-    const std::string plain = std::string(MESHPORT_TEST_DATA "/ply/valid/") + name;
-    const TemporaryFile compressed(std::string(name) + ".gz", gzipped(fileBytes(plain)));
+  for (const char* file : files) {
+    const std::string plain = file;
+    const std::string name = plain.substr(plain.find_last_of('/') + 1);
+    const TemporaryFile compressed(name + ".gz", gzipped(fileBytes(plain)));
     for (const bool plans : {true, false}) {
       const ImportedScene expected = importFile(plain, plans);
       const ImportedScene imported = importFile(compressed.path(), plans);
