@@ -145,15 +145,20 @@ ColumnFunction columnFunction(DataType type, Conversion conversion) {
 }
 
 /// The arrays of one element's plan, grown together: to the element's count at once when the
-/// stream's size proved the data is there (`sized`), otherwise in steps as instances arrive.
+/// stream's size proved the data is there (`sized`), otherwise in steps as instances arrive;
+/// then, when the element is done, cut to the instances that were reached.
 class PlanTargets {
  public:
   PlanTargets(ElementPlan& plan, std::uint32_t count, bool sized);
+  ~PlanTargets();
+  PlanTargets(const PlanTargets&) = delete;
+  PlanTargets& operator=(const PlanTargets&) = delete;
 
   /// Makes room for `records` records.
   void reach(std::uint64_t records) {
     if (records > m_capacity) [[unlikely]]
       grow(records);
+    m_reached = std::max(m_reached, records);
   }
   /// Where `offset` of record `record` of array `array` lies.
   std::byte* at(std::uint32_t array, std::uint64_t record, std::uint32_t offset) const {
@@ -166,7 +171,9 @@ class PlanTargets {
 
   ElementPlan& m_plan;
   std::uint64_t m_count;
+  bool m_sized;
   std::uint64_t m_capacity = 0;
+  std::uint64_t m_reached = 0;
   base::vector<std::byte*> m_bases;
 };
 

@@ -126,6 +126,7 @@ bool PLYImporter::plyElement(const Element& element) {
 void PLYImporter::finishElement() {
   if (!m_element) return;
   m_badIndices.finish(*m_element);
+  evenTargets();
   finishFaceData();
   if (m_primitive) {
     m_primitive->attribute<std::uint32_t>(meshPrimitive_schema::indexCount(),
@@ -135,9 +136,19 @@ void PLYImporter::finishElement() {
   m_element = nullptr;
 }
 
+void PLYImporter::evenTargets() {
+  std::size_t length = 0;
+  for (const Target& target : m_targets) length = std::max(length, target.size());
+  for (const Target& target : m_targets) target.resize(length);
+  for (base::vector<base::base_vec4<float>>* colours : m_opaqueColours) {
+    for (auto& colour : *colours) colour.w = 1.0f;
+  }
+  m_opaqueColours.clear();
+}
+
 bool PLYImporter::prepareVertices(const Element& element) {
   base::AttribMap& mesh = *m_currentMesh;
-  const std::uint32_t count = element.count;
+  const std::uint32_t count = initialCount(element);
   bool wanted = false;
   // Lists made by an earlier vertex element take no values from this one.
   base::vector<base::base_vec3<float>>* positions = nullptr;
@@ -262,6 +273,11 @@ void PLYImporter::routeVertexProperties(const Element& element, std::uint32_t po
         break;
     }
   }
+  // Lists that grow with the data start without their opaque alpha.
+  m_opaqueColours.clear();
+  for (std::size_t g = 0; !m_sized && g < m_rgbaLists.size() && g < filled.size(); ++g) {
+    if (!filled[g][3]) m_opaqueColours.push_back(m_rgbaLists[g]);
+  }
 }
 
 std::size_t PLYImporter::colourGroup(const base::vector<std::uint32_t>& groupFamily,
@@ -375,8 +391,10 @@ void PLYImporter::plyProperty(const Element& element, const Property& property, 
 
 void PLYImporter::storeValue(const Route& route, const Property& property, const ValueArray& values) {
   const Target& target = m_targets[route.target];
-  if (values.empty() || m_instanceIndex >= target.size()) return;
-  std::byte* at = target.resize(0) + std::size_t(m_instanceIndex) * target.stride + route.offset;
+  if (values.empty()) return;
+  // Lists that grow with the data take each instance as it arrives.
+  if (m_instanceIndex >= target.size()) target.resize(std::size_t(m_instanceIndex) + 1);
+  std::byte* at = target.resize(target.size()) + std::size_t(m_instanceIndex) * target.stride + route.offset;
   if (route.conversion == Conversion::native) return storeNative(values[0], property.type, at);
   const float value = converted(values[0], property, route.conversion);
   std::memcpy(at, &value, sizeof value);

@@ -96,7 +96,7 @@ void PLYImporter::prepareCustomProperties(const Element& element) {
       const base::string name = customName(element, property.name);
       if (!property.isList) {
         auto& list = m_currentMesh->attribute<base::vector<Native>>(base::intern(name), base::vector<Native>());
-        list.resize(element.count);  // sized like the mesh's other lists
+        list.resize(initialCount(element));  // sized like the mesh's other lists
         m_routes[p] = Route{Route::Kind::value, Conversion::native, addTarget(list), 0};
         if (faces) m_faceReorders.push_back({primitive, [&list](const auto& order) { reorderEntries(list, order); }});
         return true;

@@ -54,8 +54,8 @@ void PLYImporter::prepareFaceData(const Element& element) {
     const bool alpha = std::any_of(element.properties.begin(), element.properties.end(),
                                    [](const Property& p) { return p.semantic == PropertySemantic::alpha; });
     const std::uint32_t target =
-        alpha ? addTarget(newFaceColours<base::base_vec4<float>>(*m_faceColourSet, element.count))
-              : addTarget(newFaceColours<base::base_vec3<float>>(*m_faceColourSet, element.count));
+        alpha ? addTarget(newFaceColours<base::base_vec4<float>>(*m_faceColourSet, initialCount(element)))
+              : addTarget(newFaceColours<base::base_vec3<float>>(*m_faceColourSet, initialCount(element)));
     for (std::size_t p = 0; p < element.properties.size(); ++p) {
       const Property& property = element.properties[p];
       if (property.isList || !isFaceColour(property.semantic)) continue;

@@ -119,6 +119,7 @@ bool PLYImporter::importScene(base::PluginFactory& factory, std::string_view pat
   m_faceReorders.clear();
   m_faceChannels.clear();
   const base::Stream file = base::fs::master().open(path, base::fs::openForReading);
+  m_sized = file.has(base::capSize);
   base::Stream stream = base::progressStream(file, fmt::format("Importing {}", path));
   m_currentMesh = createRequired(factory, mesh_schema::typeName());
 

@@ -69,6 +69,11 @@ class PLYImporter final : public scene::SceneImportPlugin {
   };
 
   void finishElement();
+  /// The entries to make for an element's lists before its data arrives: its count when the
+  /// stream's size bounds the counts, none otherwise (the lists then grow as data arrives).
+  std::uint32_t initialCount(const Element& element) const { return m_sized ? element.count : 0; }
+  /// Brings the current element's lists to one length when they grew with the data.
+  void evenTargets();
   bool prepareVertices(const Element& element);
   bool prepareIndices(const Element& element);
   void prepareMaterials(const Element& element);
@@ -120,6 +125,8 @@ class PLYImporter final : public scene::SceneImportPlugin {
   bool m_importCustomProperties = false;
   /// Off only for tests that compare the column plans with the per-property path.
   bool m_columnPlans = true;
+  /// Whether the stream has a size (then the header bounds every count by the data).
+  bool m_sized = true;
 
   base::ref<base::IPlugin> m_currentMesh;
   base::vector<base::base_vec3<float>>* m_positionsList = nullptr;
@@ -131,12 +138,17 @@ class PLYImporter final : public scene::SceneImportPlugin {
   base::vector<base::vector<base::base_vec3<float>>*> m_rgbLists;
   base::vector<base::vector<base::base_vec4<float>>*> m_rgbaLists;
   base::vector<base::vector<float>*> m_floatLists;
+  /// RGBA lists of the current element that no alpha reaches, made opaque when it ends.
+  base::vector<base::vector<base::base_vec4<float>>*> m_opaqueColours;
 
   base::vector<base::base_vec3<float>> m_materialDiffuse;
   base::vector<base::base_vec3<float>> m_materialAmbient;
   base::vector<base::base_vec3<float>> m_materialSpecular;
   base::vector<float> m_materialSpecularPower;
   base::vector<base::base_vec3<float>> m_materialOpacity;
+  /// Which of the five material lists (ambient, diffuse, specular, power, opacity) the
+  /// current material element fills.
+  std::array<bool, 5> m_materialPresent{};
 
   // The current element: its lists, the route of each property, its index sink.
   const Element* m_element = nullptr;
@@ -178,7 +190,7 @@ class PLYImporter final : public scene::SceneImportPlugin {
 template <class T>
 std::uint32_t PLYImporter::addTarget(base::vector<T>& list) {
   m_targets.push_back({[&list](std::size_t records) {
-                         if (records > list.size()) list.resize(records);
+                         list.resize(records);
                          return reinterpret_cast<std::byte*>(list.data());
                        },
                        [&list] { return list.size(); }, sizeof(T)});

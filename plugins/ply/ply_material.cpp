@@ -8,24 +8,33 @@
 #include "scene_schema.h"
 
 #include <algorithm>
+#include <array>
 
 namespace ply {
 namespace {
 
 using scene::principalMaterial_schema;
 
-// A list is sized by the red property of its group only; entries keep what an earlier
-// material element put there, new ones read as zero.
+// A list is sized by the red property of its group only (to `count`: 0 when it grows with
+// the data); entries keep what an earlier material element put there, new ones read as zero.
+// `present` says which lists take values from this element.
 template <class T>
-void sizeFor(const Element& element, PropertySemantic semantic, base::vector<T>& list) {
-  const bool present = std::any_of(element.properties.begin(), element.properties.end(),
-                                   [semantic](const Property& p) { return p.semantic == semantic; });
-  if (present) list.resize(element.count);
+void sizeFor(const Element& element, PropertySemantic semantic, std::uint32_t count, base::vector<T>& list,
+             std::array<bool, 5>& present, std::size_t slot) {
+  present[slot] = std::any_of(element.properties.begin(), element.properties.end(),
+                              [semantic](const Property& p) { return p.semantic == semantic; });
+  if (present[slot]) list.resize(count);
 }
 
-void setComponent(base::vector<base::base_vec3<float>>& list, std::uint32_t i, std::uint32_t component, float value) {
-  if (i >= list.size()) return;
-  (component == 0 ? list[i].x : component == 1 ? list[i].y : list[i].z) = value;
+// Entry i of a list: a list that the element sizes grows to it (when it grows with the
+// data); another one has it only when an earlier element made it. Null otherwise.
+template <class T>
+T* entry(base::vector<T>& list, bool present, std::uint32_t i) {
+  if (i >= list.size()) {
+    if (!present) return nullptr;
+    list.resize(std::size_t(i) + 1);
+  }
+  return &list[i];
 }
 
 // A component that is not a number counts as opaque.
@@ -34,11 +43,12 @@ bool isOpaque(float component) { return component != component || component == 1
 }  // namespace
 
 void PLYImporter::prepareMaterials(const Element& element) {
-  sizeFor(element, PropertySemantic::diffuseRed, m_materialDiffuse);
-  sizeFor(element, PropertySemantic::ambientRed, m_materialAmbient);
-  sizeFor(element, PropertySemantic::specularRed, m_materialSpecular);
-  sizeFor(element, PropertySemantic::specularPower, m_materialSpecularPower);
-  sizeFor(element, PropertySemantic::opacity, m_materialOpacity);
+  const std::uint32_t count = initialCount(element);
+  sizeFor(element, PropertySemantic::ambientRed, count, m_materialAmbient, m_materialPresent, 0);
+  sizeFor(element, PropertySemantic::diffuseRed, count, m_materialDiffuse, m_materialPresent, 1);
+  sizeFor(element, PropertySemantic::specularRed, count, m_materialSpecular, m_materialPresent, 2);
+  sizeFor(element, PropertySemantic::specularPower, count, m_materialSpecularPower, m_materialPresent, 3);
+  sizeFor(element, PropertySemantic::opacity, count, m_materialOpacity, m_materialPresent, 4);
   for (Route& route : m_routes) route.kind = Route::Kind::material;
 }
 
@@ -48,11 +58,15 @@ void PLYImporter::storeMaterialValue(const Property& property, float value) {
   const auto semantic = static_cast<std::uint32_t>(property.semantic);
   base::vector<base::base_vec3<float>>* groups[] = {&m_materialAmbient, &m_materialDiffuse, &m_materialSpecular};
   if (semantic >= first && semantic < first + 12 && (semantic - first) % 4 != 3) {
-    setComponent(*groups[(semantic - first) / 4], i, (semantic - first) % 4, value);
-  } else if (property.semantic == PropertySemantic::specularPower && i < m_materialSpecularPower.size()) {
-    m_materialSpecularPower[i] = value;
-  } else if (property.semantic == PropertySemantic::opacity && i < m_materialOpacity.size()) {
-    m_materialOpacity[i] = {value, value, value};
+    const std::uint32_t group = (semantic - first) / 4;
+    if (base::base_vec3<float>* colour = entry(*groups[group], m_materialPresent[group], i)) {
+      const std::uint32_t component = (semantic - first) % 4;
+      (component == 0 ? colour->x : component == 1 ? colour->y : colour->z) = value;
+    }
+  } else if (property.semantic == PropertySemantic::specularPower) {
+    if (float* power = entry(m_materialSpecularPower, m_materialPresent[3], i)) *power = value;
+  } else if (property.semantic == PropertySemantic::opacity) {
+    if (auto* opacity = entry(m_materialOpacity, m_materialPresent[4], i)) *opacity = {value, value, value};
   }
 }
 

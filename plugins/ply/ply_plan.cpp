@@ -80,8 +80,14 @@ void BadIndexReport::finish(const Element& element) {
 namespace detail {
 
 PlanTargets::PlanTargets(ElementPlan& plan, std::uint32_t count, bool sized)
-    : m_plan(plan), m_count(count), m_bases(plan.arrays.size(), nullptr) {
+    : m_plan(plan), m_count(count), m_sized(sized), m_bases(plan.arrays.size(), nullptr) {
   if (sized) grow(count);
+}
+
+PlanTargets::~PlanTargets() {
+  // Room made ahead of data that never came is given back; it only shrinks the arrays.
+  if (m_sized || m_capacity == m_reached) return;
+  for (const RecordArray& array : m_plan.arrays) array.resize(m_reached);
 }
 
 void PlanTargets::grow(std::uint64_t records) {

@@ -29,7 +29,9 @@ struct RecordArray {
   /// Makes room for `records` records, keeping those already there, and returns the first.
   /// New records must read as the receiver wants unfilled ones to read (zero, or an alpha of
   /// 1). The reader asks for the element's count when the stream's size proves the data is
-  /// there, and otherwise grows in steps as data arrives, never past the count.
+  /// there, and otherwise grows in steps as data arrives, never past the count; at the end of
+  /// such an element it asks once more, for the instances that were reached, which may be
+  /// fewer than the array holds.
   std::function<std::byte*(std::size_t records)> resize;
   std::uint32_t stride = 0;  ///< bytes from one record to the next
 };
