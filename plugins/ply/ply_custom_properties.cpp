@@ -11,6 +11,8 @@
 #include "scene_mesh.h"
 #include "scene_schema.h"
 
+#include <string>
+
 namespace ply {
 namespace {
 
@@ -72,14 +74,17 @@ bool isCustom(const Property& property, PropertySemantic imported) {
 }  // namespace
 
 base::string PLYImporter::customName(const Element& element, std::string_view name) {
-  // A name that another element's property took already gets the element's name as well.
-  base::string kept = "ply:";
-  kept += name;
+  // A name that an earlier element's property took gets the element's name as well, then a
+  // number: a list once made is never replaced, as the faces' reordering holds on to it.
   const auto taken = [this](const base::string& candidate) {
     return m_currentMesh->findMember(base::intern(candidate)) ||
            m_currentMesh->findMember(base::intern(candidate + ".counts"));
   };
-  if (taken(kept)) kept = "ply:" + base::string(displayName(element)) + "." + base::string(name);
+  const base::string plain = "ply:" + base::string(name);
+  if (!taken(plain)) return plain;
+  const base::string qualified = "ply:" + base::string(displayName(element)) + "." + base::string(name);
+  base::string kept = qualified;
+  for (int k = 2; taken(kept); ++k) kept = qualified + "." + base::string(std::to_string(k));
   return kept;
 }
 

@@ -11,7 +11,7 @@
 #include <algorithm>
 #include <bit>
 #include <cstring>
-#include <ranges>
+#include <numeric>
 
 namespace ply {
 namespace {
@@ -115,8 +115,8 @@ void PLYImporter::finishFaceUVs(std::uint32_t start, std::uint32_t corners) {
   using UV = base::base_vec2<float>;
   base::vector<UV>& uvs = m_faceUVSet->attribute<base::vector<UV>>(meshUVSet_schema::UV(), base::vector<UV>());
   base::vector<std::uint32_t>& channel = newFaceChannel(*m_faceUVSet, start, corners);
-  const auto serial = std::views::iota(0u, corners);
-  channel.insert(channel.end(), serial.begin(), serial.end());
+  channel.resize(std::size_t(start) + corners);
+  std::iota(channel.begin() + start, channel.end(), 0u);
   const base::vector<std::uint16_t>& faces = *m_vcountsList;
   const bool matching = m_faceItemCounts.size() == faces.size() && m_faceItems.size() == 2 * std::size_t(corners) &&
                         std::equal(faces.begin(), faces.end(), m_faceItemCounts.begin(),

@@ -138,11 +138,16 @@ TEST(CustomProperties, PerFaceOnesFollowTheFacesIntoTheirEncodedOrder) {
     fmt::format_to(out, "{} {} {} {} {}\n", face.quality, face.corners.size(), fmt::join(face.corners, " "),
                    face.tags.size(), fmt::join(face.tags, " "));
   }
+  // A second face element of one triangle: its names are taken twice over.
+  text.insert(text.find("end_header"),
+              "element face 1\nproperty float quality\nproperty list uchar int vertex_indices\n");
+  text += "9.5 3 0 1 2\n";
   for (const bool plans : {true, false}) {
     ImportedScene imported = importText(text, plans, keep);
     base::AttribMap& mesh = imported.mesh();
-    // The vertex element took the plain name first.
+    // The vertex element took the plain name first, the first face element the qualified one.
     EXPECT_EQ(kept<float>(mesh, "ply:quality")[7], -7.0f);
+    EXPECT_EQ(kept<float>(mesh, "ply:face.quality.2"), (base::vector<float>{9.5f}));
     const auto& quality = kept<float>(mesh, "ply:face.quality");
     const auto& counts = kept<std::uint32_t>(mesh, "ply:tags.counts");
     const auto& items = kept<std::int16_t>(mesh, "ply:tags.items");
