@@ -11,7 +11,7 @@
 #include "scene_mesh.h"
 #include "scene_schema.h"
 
-#include <string>
+#include <fmt/format.h>
 
 namespace ply {
 namespace {
@@ -84,7 +84,7 @@ base::string PLYImporter::customName(const Element& element, std::string_view na
   if (!taken(plain)) return plain;
   const base::string qualified = "ply:" + base::string(displayName(element)) + "." + base::string(name);
   base::string kept = qualified;
-  for (int k = 2; taken(kept); ++k) kept = qualified + "." + base::string(std::to_string(k));
+  for (int k = 2; taken(kept); ++k) kept = qualified + fmt::format(".{}", k).c_str();
   return kept;
 }
 
