@@ -43,7 +43,7 @@ std::vector<std::string> plainFiles() {
 TEST(GzipImport, AGzippedFileImportsAsTheFileItHolds) {
   testing_support::LogCapture quiet;
   for (const std::string& plain : plainFiles()) {
-    const std::string name = plain.substr(plain.find_last_of('/') + 1);
+    const std::string name = std::filesystem::path(plain).filename().string();
     const TemporaryFile compressed(name + ".gz", gzipped(fileBytes(plain)));
     for (const bool plans : {true, false}) {
       const ImportedScene expected = importFile(plain, plans);
