@@ -1,4 +1,5 @@
-# Installs the build to a fresh prefix, builds the consumer project against it and runs it.
+# Installs the build to a fresh prefix, builds the consumer project against it (through
+# find_package, then through pkg-config) and runs it, then runs scenetool from the prefix.
 # Variables: BUILD_DIR, SOURCE_DIR, WORK_DIR, COMPILER, CXX_FLAGS, LINKER_FLAGS, PLY_FILE.
 file(REMOVE_RECURSE ${WORK_DIR})
 function(run)
@@ -13,4 +14,18 @@ run(${CMAKE_COMMAND} -S ${SOURCE_DIR} -B ${WORK_DIR}/build -G Ninja -DCMAKE_PREF
     -DCMAKE_CXX_COMPILER=${COMPILER} "-DCMAKE_CXX_FLAGS=${CXX_FLAGS}" "-DCMAKE_EXE_LINKER_FLAGS=${LINKER_FLAGS}")
 run(${CMAKE_COMMAND} --build ${WORK_DIR}/build)
 run(${WORK_DIR}/build/read_ply ${PLY_FILE})
+message("${output}")
+run(${WORK_DIR}/build/import_scene ${WORK_DIR}/prefix ${PLY_FILE})
+message("${output}")
+# The same through pkg-config, for build systems without CMake.
+file(GLOB_RECURSE package_file ${WORK_DIR}/prefix/*/meshport.pc)
+run(pkg-config --cflags --libs ${package_file})
+separate_arguments(flags UNIX_COMMAND "${output}")
+separate_arguments(compile_flags UNIX_COMMAND "${CXX_FLAGS}")
+separate_arguments(link_flags UNIX_COMMAND "${LINKER_FLAGS}")
+run(${COMPILER} ${compile_flags} ${SOURCE_DIR}/import_scene.cpp ${flags} ${link_flags} -o ${WORK_DIR}/import_scene_pc)
+run(${WORK_DIR}/import_scene_pc ${WORK_DIR}/prefix ${PLY_FILE})
+message("${output}")
+# The programs work from the installed tree.
+run(${WORK_DIR}/prefix/bin/scenetool import ${PLY_FILE})
 message("${output}")
