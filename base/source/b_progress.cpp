@@ -27,6 +27,14 @@ void Progress::report(std::uint64_t done) {
 
 namespace {
 
+// The stream whose position tells how far a read has come: the source itself, or, for data
+// without a size (a gzip file's), the sized stream that the data is decoded from.
+Stream measuredStream(const Stream& source) {
+  if (source.has(capSize | capPosition) || !source.has(capSource)) return source;
+  Stream inner = source.worker()->getSource();
+  return inner.has(capSize | capPosition) ? inner : source;
+}
+
 // Reads through to the source and reports the position after each read.
 class ProgressWorker final : public StreamWorker {
  public:
@@ -34,11 +42,12 @@ class ProgressWorker final : public StreamWorker {
       : StreamWorker(source.worker()->capabilities() & ~(capMemory | capInMemory | capWrite | capSetSize),
                      source.name()),
         m_source(source),
-        m_progress(logIO, what, static_cast<std::uint64_t>(source.getSize())) {}
+        m_measured(measuredStream(source)),
+        m_progress(logIO, what, static_cast<std::uint64_t>(m_measured.getSize())) {}
 
   std::uint32_t read(void* buffer, std::uint32_t count) override {
     const std::uint32_t got = m_source.read(buffer, count);
-    m_progress.at(static_cast<std::uint64_t>(m_source.getPosition()));
+    m_progress.at(static_cast<std::uint64_t>(m_measured.getPosition()));
     return got;
   }
   std::int64_t setPosition(std::int64_t offset, std::uint32_t origin) override {
@@ -52,6 +61,7 @@ class ProgressWorker final : public StreamWorker {
 
  private:
   Stream m_source;
+  Stream m_measured;
   Progress m_progress;
 };
 

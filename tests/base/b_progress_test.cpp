@@ -1,4 +1,5 @@
 #include "b_progress.h"
+#include "gzip_data.h"
 #include "log_capture.h"
 
 #include <gtest/gtest.h>
@@ -42,6 +43,27 @@ TEST(Progress, AReadingStreamReportsHowFarItRead) {
   EXPECT_EQ(log.progressReports[0].what, "Reading data");
   EXPECT_EQ(log.progressReports[1].done, 500u);
   EXPECT_EQ(log.progressReports[3].done, 1000u);
+}
+
+// Decompressed data has no size: the reads are measured on the compressed stream.
+TEST(Progress, DecompressedDataReportsHowFarTheCompressedStreamIsRead) {
+  std::string data;
+  for (int k = 0; data.size() < 1000000; ++k) data += std::to_string(k * 7919 % 100003) + " ";
+  const std::string compressed = testing_support::gzipped(data);
+  base::Stream source = base::memStream(compressed.data(), std::int64_t(compressed.size()), "data.gz");
+  LogCapture log;
+  {
+    base::Stream stream = base::progressStream(base::inflateStream(source), "Reading data.gz");
+    EXPECT_FALSE(stream.has(base::capSize));
+    std::string buffer(4096, '\0');
+    while (stream.read(buffer.data(), 4096) > 0) {
+    }
+  }
+  ASSERT_GE(log.progressReports.size(), 3u);
+  EXPECT_EQ(log.progressReports.back().total, compressed.size());
+  EXPECT_EQ(log.progressReports.back().done, compressed.size());
+  EXPECT_GT(log.progressReports[1].done, 0u);
+  EXPECT_LT(log.progressReports[1].done, compressed.size());
 }
 
 }  // namespace
