@@ -58,6 +58,7 @@ struct Property {
   DataType type = DataType::none;  ///< the value's type, or each list item's
   PropertySemantic semantic = PropertySemantic::unknown;
   base::string name;  ///< kept only when the semantic is unknown
+  base::string word;  ///< the name as the header spells it, whatever the semantic ("s", "tx")
   bool isList = false;
   DataType countType = DataType::none;  ///< the list count's type; only for lists
 };

@@ -158,6 +158,7 @@ bool parseProperty(Header& header, HeaderWords& words) {
   const std::optional<std::string_view> name = words.argument();
   if (!name) return lineEnded(words, "the property's name");
   property.semantic = propertySemanticFromName(*name);
+  property.word = *name;
   if (property.semantic == PropertySemantic::unknown) {
     property.name = *name;
     words.skipRestOfLine();

@@ -1,6 +1,8 @@
 # Installs the build to a fresh prefix, builds the consumer project against it (through
 # find_package, then through pkg-config) and runs it, then runs scenetool from the prefix.
-# Variables: BUILD_DIR, SOURCE_DIR, WORK_DIR, COMPILER, CXX_FLAGS, LINKER_FLAGS, PLY_FILE.
+# With PYTHON set, the installed Python package then imports the file as well.
+# Variables: BUILD_DIR, SOURCE_DIR, WORK_DIR, COMPILER, CXX_FLAGS, LINKER_FLAGS, PLY_FILE,
+# PYTHON and PYTHON_DIR (the package's folder under the prefix; both optional).
 file(REMOVE_RECURSE ${WORK_DIR})
 function(run)
   execute_process(COMMAND ${ARGN} RESULT_VARIABLE result OUTPUT_VARIABLE output ERROR_VARIABLE output)
@@ -29,3 +31,8 @@ message("${output}")
 # The programs work from the installed tree.
 run(${WORK_DIR}/prefix/bin/scenetool import ${PLY_FILE})
 message("${output}")
+if(PYTHON)
+  run(${CMAKE_COMMAND} -E env PYTHONPATH=${WORK_DIR}/prefix/${PYTHON_DIR} PYTHONDONTWRITEBYTECODE=1 ${PYTHON}
+      ${SOURCE_DIR}/import_scene.py ${PLY_FILE})
+  message("${output}")
+endif()

@@ -106,8 +106,12 @@ TEST(PlyHeader, ElementsAndPropertiesWithTheirSemantics) {
   EXPECT_EQ(vertex.properties[1].type, ply::DataType::uint8);
   EXPECT_EQ(vertex.properties[1].semantic, ply::PropertySemantic::red);
   EXPECT_EQ(vertex.properties[2].semantic, ply::PropertySemantic::u);
+  EXPECT_EQ(vertex.properties[2].name, "");
   EXPECT_EQ(vertex.properties[3].semantic, ply::PropertySemantic::unknown);
   EXPECT_EQ(vertex.properties[3].name, "quality");
+  // The header's own spelling stays beside the semantic, so that "tx" and "u" keep apart.
+  EXPECT_EQ(vertex.properties[2].word, "tx");
+  EXPECT_EQ(vertex.properties[3].word, "quality");
   const ply::Property& indices = parsed.header.elements[1].properties.at(0);
   EXPECT_TRUE(indices.isList);
   EXPECT_EQ(indices.countType, ply::DataType::uint8);

@@ -58,7 +58,7 @@ int runImport(const ImportOptions& options) {
   if (options.json) {
     printSceneJson(*scene);
   } else {
-    printSceneSummary(*scene);
+    fmt::print("{}", scene::sceneSummary(*scene));
     fmt::print("imported {} in {:.1f} ms\n", options.file, elapsed.count());
   }
   if (!options.output.empty() && !writeScene(*scene, options.output)) return exitFailed;

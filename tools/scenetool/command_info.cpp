@@ -21,7 +21,7 @@ int runInfo(const InfoOptions& options) {
   base::ref<base::PluginFactory> factory(new base::PluginFactory("scene"));
   scene::register_scene_schema(*factory);
   if (const int read = readObjectList(options.file, *factory); read != exitOk) return read;
-  options.json ? printSceneJson(*factory) : printSceneSummary(*factory);
+  options.json ? printSceneJson(*factory) : fmt::print("{}", scene::sceneSummary(*factory));
   return exitOk;
 }
 

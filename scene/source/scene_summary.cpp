@@ -14,17 +14,15 @@
 #include <string>
 #include <vector>
 
-namespace scenetool {
+namespace scene {
 namespace {
-
-using scene::mesh_schema;
 
 std::string plural(std::size_t count, const char* one, const char* many) {
   return fmt::format("{} {}", count, count == 1 ? one : many);
 }
 
 std::size_t arraySize(const base::AttribMap& map, base::name_id name) {
-  const base::AttribArray* array = scene::findArrayMember(map, name);
+  const base::AttribArray* array = findArrayMember(map, name);
   return array ? array->size() : 0;
 }
 
@@ -32,8 +30,7 @@ std::string meshDetails(const base::AttribMap& mesh) {
   const auto* positions = mesh.findVecAttribute<base::base_vec3<float>>(mesh_schema::positions());
   std::string text =
       fmt::format("{}, {}, {}, {}, {}, {}", plural(positions ? positions->size() : 0, "vertex", "vertices"),
-                  plural(scene::getFaceCount(mesh), "face", "faces"),
-                  plural(scene::getTriangleCount(mesh), "triangle", "triangles"),
+                  plural(getFaceCount(mesh), "face", "faces"), plural(getTriangleCount(mesh), "triangle", "triangles"),
                   plural(arraySize(mesh, mesh_schema::primitives()), "primitive", "primitives"),
                   plural(arraySize(mesh, mesh_schema::colorSets()), "colour set", "colour sets"),
                   plural(arraySize(mesh, mesh_schema::uvSets()), "UV set", "UV sets"));
@@ -60,18 +57,20 @@ std::string keptProperties(const base::AttribMap& mesh) {
 
 }  // namespace
 
-void printSceneSummary(const base::PluginFactory& factory) {
+std::string sceneSummary(const base::PluginFactory& factory) {
+  std::string summary;
   for (const base::ref<base::IPlugin>& object : factory.objects()) {
     if (!object) continue;
     const base::string name = object->toString();
     const std::string label = fmt::format("object {}: {}{}", object->index(), base::text(object->mapType()),
                                           name.empty() ? std::string() : fmt::format(" '{}'", name));
     if (object->mapType() == mesh_schema::typeName()) {
-      fmt::print("{}: {}\n{}", label, meshDetails(*object), keptProperties(*object));
+      summary += fmt::format("{}: {}\n{}", label, meshDetails(*object), keptProperties(*object));
     } else {
-      fmt::print("{} ({})\n", label, plural(object->size(), "attribute", "attributes"));
+      summary += fmt::format("{} ({})\n", label, plural(object->size(), "attribute", "attributes"));
     }
   }
+  return summary;
 }
 
-}  // namespace scenetool
+}  // namespace scene

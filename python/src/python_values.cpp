@@ -1,0 +1,133 @@
+#include "python_values.h"
+
+#include "b_attrib_array.h"
+#include "b_attrib_factory.h"
+#include "b_attribute_map.h"
+#include "b_structured.h"
+
+#include <cmath>
+#include <limits>
+#include <map>
+#include <memory>
+#include <optional>
+#include <vector>
+
+namespace pymeshport {
+namespace {
+
+// Builds Python values from the structured form of an attribute.
+class PythonValueWriter : public base::StructuredWriter {
+ public:
+  void beginObject() override { open(py::dict()); }
+  void key(std::string_view name) override { m_key = py::str(name.data(), name.size()); }
+  void endObject() override { close(); }
+  void beginArray() override { open(py::list()); }
+  void endArray() override { close(); }
+  void null() override { put(py::none()); }
+  void value(bool value) override { put(py::bool_(value)); }
+  void value(std::int64_t value) override { put(py::int_(value)); }
+  void value(std::uint64_t value) override { put(py::int_(value)); }
+  void value(float value) override { put(py::float_(value)); }
+  void value(double value) override { put(py::float_(value)); }
+  void value(std::string_view text) override { put(py::str(text.data(), text.size())); }
+
+  py::object result() const { return m_result; }
+
+ private:
+  void open(py::object container) {
+    put(container);
+    m_open.push_back(std::move(container));
+  }
+  void close() { m_open.pop_back(); }
+  void put(const py::object& value) {
+    if (m_open.empty()) {
+      m_result = value;
+    } else if (py::isinstance<py::dict>(m_open.back())) {
+      m_open.back()[m_key] = value;
+    } else {
+      m_open.back().cast<py::list>().append(value);
+    }
+  }
+
+  std::vector<py::object> m_open;
+  py::object m_key;
+  py::object m_result = py::none();
+};
+
+std::optional<py::dtype> dtypeOfComponent(std::uint8_t code) {
+  switch (code) {
+    case 0:
+      return py::dtype::of<std::int8_t>();
+    case 1:
+      return py::dtype::of<std::uint8_t>();
+    case 2:
+      return py::dtype::of<std::int16_t>();
+    case 3:
+      return py::dtype::of<std::uint16_t>();
+    case 4:
+      return py::dtype::of<bool>();
+    case 5:
+      return py::dtype::of<std::uint32_t>();
+    case 6:
+      return py::dtype::of<std::int32_t>();
+    case 7:
+      return py::dtype::of<std::int64_t>();
+    case 8:
+      return py::dtype::of<std::uint64_t>();
+    case 10:
+      return py::dtype::of<float>();
+    case 11:
+      return py::dtype::of<double>();
+    default:
+      return std::nullopt;
+  }
+}
+
+// The bytes of one value of a list type ("vec3f[]" holds values of "vec3f"), from a value
+// the factory makes; 0 when the factory does not know the value type.
+std::uint32_t valueBytes(base::name_id listType) {
+  static std::map<base::name_id, std::uint32_t> known;
+  const auto found = known.find(listType);
+  if (found != known.end()) return found->second;
+  const std::string_view text = base::text(listType);
+  std::uint32_t bytes = 0;
+  const std::string_view valueType = text.substr(0, text.size() - 2);
+  // Object references hold pointers; their structured form gives the objects' indices.
+  if (text.ends_with("[]") && valueType != "plugin") {
+    const std::unique_ptr<base::Attribute> value(base::attribFactory().create(base::intern(valueType)));
+    if (value && value->componentType() != 9 && value->componentType() != 0xFF) bytes = value->byteSize();
+  }
+  return known[listType] = bytes;
+}
+
+// A list of numbers, or of fixed vectors of them, as an array; none for any other attribute.
+std::optional<py::array> numberList(const base::Attribute& attribute, const ListArrayMaker& makeArray) {
+  const std::optional<py::dtype> dtype = dtypeOfComponent(attribute.componentType());
+  const std::uint32_t bytes = dtype ? valueBytes(attribute.type()) : 0;
+  if (bytes == 0 || bytes % dtype->itemsize() != 0) return std::nullopt;
+  const std::size_t width = bytes / static_cast<std::size_t>(dtype->itemsize());
+  return makeArray(attribute, attribute.data(0), attribute.size(), width == 1 ? 0 : width, *dtype);
+}
+
+}  // namespace
+
+py::object toPython(const base::Attribute& attribute, const ListArrayMaker& makeArray) {
+  if (const base::AttribMap* map = attribute.asMap()) {
+    std::map<std::string_view, const base::Attribute*> sorted;
+    for (const auto& [name, member] : map->members()) sorted.emplace(base::text(name), member);
+    py::dict members;
+    for (const auto& [name, member] : sorted) members[py::str(name.data(), name.size())] = toPython(*member, makeArray);
+    return members;
+  }
+  if (const base::AttribArray* array = attribute.asArray()) {
+    py::list elements;
+    for (const auto& element : array->elements()) elements.append(toPython(*element, makeArray));
+    return elements;
+  }
+  if (std::optional<py::array> list = numberList(attribute, makeArray)) return std::move(*list);
+  PythonValueWriter writer;
+  attribute.writeValue(writer);
+  return writer.result();
+}
+
+}  // namespace pymeshport
