@@ -1,9 +1,10 @@
 #!/usr/bin/env python3
 """Writes the figures of one ply_bench run into the generated part of docs/performance.md.
 
-usage: bench_report.py PLY_BENCH_JSON SCENETOOL PERFORMANCE_MD
+usage: bench_report.py PLY_BENCH_JSON SCENETOOL PERFORMANCE_MD [PYTHON_BENCH_MD]
 
-Medians of the run's repetitions; scenetool is timed here as a whole process. The part
+Medians of the run's repetitions; scenetool is timed here as a whole process. The table that
+bench/python_bench.py printed, when given, goes in as the Python section. The part
 between the two marker lines is replaced (appended when they are missing) and printed.
 """
 
@@ -162,7 +163,7 @@ def process_table(runs, scenetool):
 
 
 def main():
-    if len(sys.argv) != 4:
+    if len(sys.argv) not in (4, 5):
         sys.exit(__doc__)
     runs = medians(sys.argv[1])
     sections = [
@@ -174,6 +175,8 @@ def main():
         "### The reference importer", "", *assimp_table(runs), "",
         "### scenetool as a whole process", "", *process_table(runs, sys.argv[2]),
     ]
+    if len(sys.argv) == 5:
+        sections += ["", "### From Python", "", *pathlib.Path(sys.argv[4]).read_text().splitlines()]
     generated = "\n".join([BEGIN, *sections, END])
     document = pathlib.Path(sys.argv[3])
     text = document.read_text()

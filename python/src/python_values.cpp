@@ -7,6 +7,7 @@
 
 #include <cmath>
 #include <limits>
+#include <algorithm>
 #include <map>
 #include <memory>
 #include <optional>
@@ -83,29 +84,32 @@ std::optional<py::dtype> dtypeOfComponent(std::uint8_t code) {
   }
 }
 
-// The bytes of one value of a list type ("vec3f[]" holds values of "vec3f"), from a value
-// the factory makes; 0 when the factory does not know the value type.
-std::uint32_t valueBytes(base::name_id listType) {
-  static std::map<base::name_id, std::uint32_t> known;
-  const auto found = known.find(listType);
-  if (found != known.end()) return found->second;
-  const std::string_view text = base::text(listType);
-  std::uint32_t bytes = 0;
-  const std::string_view valueType = text.substr(0, text.size() - 2);
+// The bytes of one value of the list `attribute`, a list of numbers or of fixed vectors of
+// them; 0 when it is some other list. The values lie side by side; an empty list asks the
+// factory for a value of its type.
+std::size_t valueBytes(const base::Attribute& attribute) {
+  const std::string_view type = base::text(attribute.type());
+  const std::string_view valueType = type.substr(0, type.size() - std::min<std::size_t>(type.size(), 2));
   // Object references hold pointers; their structured form gives the objects' indices.
-  if (text.ends_with("[]") && valueType != "plugin") {
-    const std::unique_ptr<base::Attribute> value(base::attribFactory().create(base::intern(valueType)));
-    if (value && value->componentType() != 9 && value->componentType() != 0xFF) bytes = value->byteSize();
+  if (!type.ends_with("[]") || valueType == "plugin") return 0;
+  if (attribute.size() >= 2) {
+    return static_cast<std::size_t>(static_cast<const std::byte*>(attribute.data(1)) -
+                                    static_cast<const std::byte*>(attribute.data(0)));
   }
-  return known[listType] = bytes;
+  if (attribute.size() == 1) return attribute.byteSize() - 4;
+  const base::name_id name = base::intern(valueType);
+  if (!base::attribFactory().knows(name)) return 0;
+  const std::unique_ptr<base::Attribute> value(base::attribFactory().create(name));
+  return value->byteSize();
 }
 
 // A list of numbers, or of fixed vectors of them, as an array; none for any other attribute.
 std::optional<py::array> numberList(const base::Attribute& attribute, const ListArrayMaker& makeArray) {
   const std::optional<py::dtype> dtype = dtypeOfComponent(attribute.componentType());
-  const std::uint32_t bytes = dtype ? valueBytes(attribute.type()) : 0;
-  if (bytes == 0 || bytes % dtype->itemsize() != 0) return std::nullopt;
-  const std::size_t width = bytes / static_cast<std::size_t>(dtype->itemsize());
+  const std::size_t bytes = dtype ? valueBytes(attribute) : 0;
+  const auto component = static_cast<std::size_t>(dtype ? dtype->itemsize() : 0);
+  if (bytes == 0 || bytes % component != 0) return std::nullopt;
+  const std::size_t width = bytes / component;
   return makeArray(attribute, attribute.data(0), attribute.size(), width == 1 ? 0 : width, *dtype);
 }
 
