@@ -73,6 +73,7 @@ int main(int argc, char** argv) {
     for (const char* folder : {"valid", "invalid"}) {
       copyFiles(source / "tests/data/ply" / folder, ".ply", output / "ply");
       copyFiles(source / "tests/data/ply" / folder, ".ply", output / "import");
+      copyFiles(source / "tests/data/ply" / folder, ".ply", output / "raw_ply");
     }
     for (const char* folder : {"", "invalid"})
       copyFiles(source / "tests/data/scene" / folder, ".scene", output / "object_list");

@@ -2,8 +2,6 @@
 
 #include "ply_columns.h"
 
-#include <algorithm>
-
 namespace pymeshport {
 namespace {
 
@@ -27,13 +25,13 @@ py::handle makeError(py::module_& module, const char* name, std::initializer_lis
 int pythonLevel(int level) {
   switch (level) {
     case base::logError:
-      return pythonError;
+      return 40;
     case base::logWarning:
-      return pythonWarning;
+      return 30;
     case base::logInfo:
       return 20;
     default:
-      return pythonDebug;
+      return 10;
   }
 }
 
@@ -79,12 +77,12 @@ void raiseFailure(const CallFailure& failure) {
   throw py::error_already_set();
 }
 
-void forwardMessages(const std::vector<CallLog::Message>& messages, const std::string& raised, int ceiling) {
+void forwardMessages(const std::vector<CallLog::Message>& messages, const std::string& raised) {
   if (messages.empty()) return;
   const py::object logger = py::module_::import("logging").attr("getLogger")("meshport");
   for (const CallLog::Message& message : messages) {
     if (!raised.empty() && raised.ends_with(message.text)) continue;
-    logger.attr("log")(std::min(pythonLevel(message.level), ceiling), "%s", message.text);
+    logger.attr("log")(pythonLevel(message.level), "%s", message.text);
   }
 }
 

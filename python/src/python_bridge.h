@@ -24,9 +24,9 @@ void defineErrors(py::module_& module);
 /// Raises the module's exception for `failure` (the interpreter lock held).
 [[noreturn]] void raiseFailure(const CallFailure& failure);
 
-/// Hands held messages to the "meshport" logger of Python's logging, at their own level or
-/// at `ceiling` when that is lower, leaving out the one a raised exception already carries.
-void forwardMessages(const std::vector<CallLog::Message>& messages, const std::string& raised, int ceiling);
+/// Hands held messages to the "meshport" logger of Python's logging, leaving out the one a
+/// raised exception already carries.
+void forwardMessages(const std::vector<CallLog::Message>& messages, const std::string& raised);
 
 /// The NumPy dtype of a PLY value type.
 py::dtype dtypeOf(ply::DataType type);
@@ -34,14 +34,11 @@ py::dtype dtypeOf(ply::DataType type);
 /// An array over `block`'s values that keeps the block's storage alive.
 py::array arrayOf(const ValueBlock& block);
 
-/// Python's logging levels.
-enum PythonLevel : int { pythonDebug = 10, pythonWarning = 30, pythonError = 40 };
-
 /// Runs `work()` on the file at `path` without the interpreter lock, with the call's log
 /// held; whatever it throws is raised as the module's exception, the other messages go to
-/// logging at no more than `ceiling`.
+/// logging.
 template <class Work>
-auto runFileCall(const std::string& path, int ceiling, Work&& work) -> decltype(work()) {
+auto runFileCall(const std::string& path, Work&& work) -> decltype(work()) {
   std::optional<decltype(work())> result;
   std::optional<CallFailure> failure;
   std::vector<CallLog::Message> messages;
@@ -55,7 +52,7 @@ auto runFileCall(const std::string& path, int ceiling, Work&& work) -> decltype(
     }
     messages = log.take();
   }
-  forwardMessages(messages, failure ? failure->message : std::string(), ceiling);
+  forwardMessages(messages, failure ? failure->message : std::string());
   if (failure) raiseFailure(*failure);
   return std::move(*result);
 }

@@ -5,9 +5,9 @@
 #include "b_attribute_map.h"
 #include "b_structured.h"
 
+#include <algorithm>
 #include <cmath>
 #include <limits>
-#include <algorithm>
 #include <map>
 #include <memory>
 #include <optional>

@@ -74,7 +74,13 @@ class RawReader {
     finishCurrent();
     m_columns.clear();
     m_columns.resize(element.properties.size());
-    for (std::size_t p = 0; p < element.properties.size(); ++p) m_columns[p].property = &element.properties[p];
+    m_lists.clear();
+    m_begun = 0;
+    for (std::size_t p = 0; p < element.properties.size(); ++p) {
+      m_columns[p].property = &element.properties[p];
+      m_columns[p].stored = element.properties[p].type;  // an element without instances gets no plan
+      if (element.properties[p].isList) base::append(m_lists, &m_columns[p]);
+    }
     m_current = &element;
     return true;
   }
@@ -84,7 +90,12 @@ class RawReader {
     return plan.fits(element);
   }
 
-  void beginInstance(std::uint32_t) {}
+  // An ASCII instance that could not be read leaves its lists out: an empty list keeps the
+  // rows in step with the instances.
+  void beginInstance(std::uint32_t index) {
+    for (Column* column : m_lists) padLists(*column, index);
+    m_begun = std::size_t(index) + 1;
+  }
 
   // Only lists arrive here: double lists, and lists too long for the plan's length column.
   void plyProperty(const ply::Element&, const ply::Property& property, const ply::ValueArray& values) {
@@ -106,6 +117,9 @@ class RawReader {
   }
 
  private:
+  static void padLists(Column& column, std::size_t instances) {
+    if (column.lengths.size() < instances) column.lengths.resize(instances, 0);
+  }
   static std::uint32_t heldPattern(const ply::Value& value, DataType type) {
     return type == DataType::float32 ? std::bit_cast<std::uint32_t>(value.f)
                                      : static_cast<std::uint32_t>(value.toInteger(type));
@@ -117,13 +131,15 @@ class RawReader {
   }
 
   ply::PropertyPlan planFor(Column& column, ply::ElementPlan& plan);
-  RawProperty finishScalar(Column& column, std::uint32_t count);
+  RawProperty finishScalar(Column& column);
   RawProperty finishList(Column& column);
   void finishCurrent();
 
   const ply::Header& m_header;
   const ply::Element* m_current = nullptr;
   base::vector<Column> m_columns;
+  base::vector<Column*> m_lists;  // the columns of list properties
+  std::size_t m_begun = 0;        // instances begun one by one (not those read in bulk)
   base::vector<RawElement> m_elements;
 };
 
@@ -156,20 +172,22 @@ ply::PropertyPlan RawReader::planFor(Column& column, ply::ElementPlan& plan) {
   return step;
 }
 
-RawProperty RawReader::finishScalar(Column& column, std::uint32_t count) {
+RawProperty RawReader::finishScalar(Column& column) {
   RawProperty result{std::string(column.property->word), {}, std::nullopt};
+  // The column holds the instances reached: all of them, unless the data ended early.
+  const std::size_t rows = column.bytes.size() / ply::dataTypeSize(column.stored);
   if (column.stored == column.property->type) {
-    const std::size_t rows = column.bytes.size() / ply::dataTypeSize(column.stored);
     result.values = blockOf(std::move(column.bytes), column.stored, rows);
   } else {
-    base::vector<std::uint32_t> held(count);
-    std::memcpy(held.data(), column.bytes.data(), std::min(column.bytes.size(), held.size() * 4));
-    result.values = heldBlock(std::move(held), column.property->type, count, std::nullopt);
+    base::vector<std::uint32_t> held(rows);
+    std::memcpy(held.data(), column.bytes.data(), rows * 4);
+    result.values = heldBlock(std::move(held), column.property->type, rows, std::nullopt);
   }
   return result;
 }
 
 RawProperty RawReader::finishList(Column& column) {
+  padLists(column, m_begun);
   RawProperty result{std::string(column.property->word), {}, std::nullopt};
   base::vector<std::uint32_t> lengths;
   lengths.reserve(column.lengths.size());
@@ -195,8 +213,7 @@ void RawReader::finishCurrent() {
   if (!m_current) return;
   RawElement element{std::string(ply::displayName(*m_current)), m_current->count, {}};
   for (Column& column : m_columns) {
-    base::append(element.properties,
-                 column.property->isList ? finishList(column) : finishScalar(column, m_current->count));
+    base::append(element.properties, column.property->isList ? finishList(column) : finishScalar(column));
   }
   base::append(m_elements, std::move(element));
   m_current = nullptr;

@@ -21,8 +21,7 @@ py::str freeKey(const py::dict& dict, const std::string& name) {
 
 py::dict readPly(const std::filesystem::path& file) {
   const std::string path = file.string();
-  // What the reader notes on the way names semantics that a raw read does not use.
-  base::vector<RawElement> elements = runFileCall(path, pythonDebug, [&] {
+  base::vector<RawElement> elements = runFileCall(path, [&] {
     base::Stream stream = base::fs::master().open(path, base::fs::openForReading);
     return readRawPly(stream);
   });
@@ -55,8 +54,9 @@ The values are those 'scenetool ply --values' shows. For an ASCII file, an integ
 property whose words leave its declared type's range (300 for a uchar) comes back in the
 32-bit type of the same signedness (int32 or uint32), so that no value changes.
 
-Files ending in .gz are decompressed as they are read. The reader's notes on the way
-(property names it knows no meaning for) go to the "meshport" logger at DEBUG level. Raises NotFoundError, CorruptError
+An ASCII instance that cannot be read is skipped, as the importer skips it, with a
+warning: its scalars read 0 from the bad word on and its lists are empty, so that every
+array keeps one row per instance. Files ending in .gz are decompressed as they are read. Raises NotFoundError, CorruptError
 (a bad header, a body that ends before the header's counts, damaged compressed data) or
 Error. The read runs without the interpreter lock.)");
 }

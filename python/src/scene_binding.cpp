@@ -165,7 +165,7 @@ std::shared_ptr<Scene> importScene(const std::filesystem::path& file, bool decod
   for (const auto& [name, value] : parameters)
     entries.emplace_back(py::str(name).cast<std::string>(), parameterText(value));
   const std::string home = packageHome();
-  return runFileCall(path, pythonError, [&] {
+  return runFileCall(path, [&] {
     auto imported = std::make_shared<Scene>(Plugins::get(home), path, decode);
     if (!imported->load(entries)) {
       throw CallError({CallFailure::Kind::corrupt, fileMessage(path, "the file is not one the scene plug-ins read")});

@@ -133,6 +133,16 @@ def test_failures_raise_the_modules_exceptions(tmp_path, write_ply):
         meshport.import_scene(write_ply("bad.ply", b"ply\nelement vertex 1\nend_header\n"))
 
 
+@pytest.mark.parametrize("path", sorted((DATA / "ply" / "invalid").glob("*.ply")), ids=lambda path: path.name)
+def test_hostile_files_import_or_raise_the_modules_exception(scenetool, path):
+    _, status = run_scenetool(scenetool, "import", str(path))
+    if status == 0:
+        assert meshport.import_scene(path).objects
+    else:
+        with pytest.raises(meshport.Error):
+            meshport.import_scene(path)
+
+
 def test_imports_on_several_threads_give_what_one_gives():
     paths = VALID * 3
     alone = [meshport.import_scene(path).summary() for path in paths]

@@ -172,6 +172,30 @@ def test_failures_raise_the_modules_exceptions_with_the_cause(tmp_path, write_pl
         meshport.read_ply(tmp_path)
 
 
+def test_an_ascii_instance_the_reader_skips_keeps_the_rows_in_step(write_ply, caplog):
+    header = ply_header("ascii", [("face", 3, [("uchar", "flag"), ("list", "uchar", "int", "vertex_indices")])])
+    face = meshport.read_ply(write_ply("skip.ply", header, b"1 3 0 1 2\n2 3 # 1 2\n3 3 4 5 6\n"))["face"]
+    assert face["flag"].tolist() == [1, 2, 3]
+    assert face["vertex_indices.counts"].tolist() == [3, 0, 3]
+    assert face["vertex_indices"].tolist() == [0, 1, 2, 4, 5, 6]
+    assert "Skipping this element instance" in caplog.text
+
+
+HOSTILE = sorted((DATA / "ply" / "invalid").glob("*.ply")) + sorted(
+    (DATA.parents[1] / "fuzz" / "regressions").glob("*/*.ply"))
+
+
+@pytest.mark.parametrize("path", HOSTILE, ids=lambda path: f"{path.parent.name}/{path.name}")
+def test_hostile_files_give_values_or_the_modules_exception(path):
+    try:
+        elements = meshport.read_ply(path)
+    except meshport.Error:
+        return
+    for element in elements.values():
+        for column in element.values():
+            assert column.flags.c_contiguous
+
+
 def test_counts_beyond_the_file_cost_no_memory(write_ply):
     header = ply_header("binary_little_endian", [("vertex", 4000000000, [("double", "x")])])
     with pytest.raises(meshport.CorruptError):
