@@ -56,9 +56,11 @@ property whose words leave its declared type's range (300 for a uchar) comes bac
 
 An ASCII instance that cannot be read is skipped, as the importer skips it, with a
 warning: its scalars read 0 from the bad word on and its lists are empty, so that every
-array keeps one row per instance. Files ending in .gz are decompressed as they are read. Raises NotFoundError, CorruptError
-(a bad header, a body that ends before the header's counts, damaged compressed data) or
-Error. The read runs without the interpreter lock.)");
+array keeps one row per instance.
+
+Files ending in .gz are decompressed as they are read. Raises NotFoundError,
+CorruptError (a bad header, a body that ends before the header's counts, damaged
+compressed data) or Error. The read runs without the interpreter lock.)");
 }
 
 }  // namespace pymeshport
