@@ -257,6 +257,7 @@ class PosixPlugin final : public IPlugin {
   ref<IEnum> findFiles(std::string_view pattern) override { return ref<IEnum>(new PosixFindFiles<true>(pattern)); }
   void remove(std::string_view path, bool recursive) override;
   void rename(std::string_view from, std::string_view to) override;
+  void replace(std::string_view from, std::string_view to) override;
   void copy(std::string_view from, std::string_view to) override;
   void touch(std::string_view path) override;
   base::string readLink(std::string_view path) override;
@@ -288,6 +289,14 @@ void PosixPlugin::rename(std::string_view from, std::string_view to) {
   if (statPath(target, info, false)) fail("base::fs::PosixPlugin::rename", "Can't rename to", target, EEXIST);
   if (::rename(source.c_str(), target.c_str()) != 0)
     fail("base::fs::PosixPlugin::rename", "Can't rename", source, errno);
+}
+
+void PosixPlugin::replace(std::string_view from, std::string_view to) {
+  const base::string source(from);
+  const base::string target(to);
+  // rename() replaces a file atomically.
+  if (::rename(source.c_str(), target.c_str()) != 0)
+    fail("base::fs::PosixPlugin::replace", "Can't replace", target, errno);
 }
 
 void PosixPlugin::copy(std::string_view from, std::string_view to) {

@@ -234,6 +234,13 @@ class WinPlugin final : public IPlugin {
       fail("base::fs::WinPlugin::rename", "Can't rename", from, GetLastError());
     }
   }
+  // A plain move never replaces a file: replacing needs the flag.
+  void replace(std::string_view from, std::string_view to) override {
+    if (!MoveFileExW(wideText(from).c_str(), wideText(to).c_str(),
+                     MOVEFILE_REPLACE_EXISTING | MOVEFILE_WRITE_THROUGH)) {
+      fail("base::fs::WinPlugin::replace", "Can't replace", to, GetLastError());
+    }
+  }
   void copy(std::string_view from, std::string_view to) override {
     const DWORD attributes = attributesOf(from);
     if (attributes != INVALID_FILE_ATTRIBUTES && (attributes & FILE_ATTRIBUTE_DIRECTORY)) {

@@ -64,6 +64,11 @@ PLYImporter::PLYImporter(base::PluginFactory* factory, base::IPluginDesc* descri
 
 PLYImporter::~PLYImporter() = default;
 
+base::IPluginInterface* PLYImporter::queryInterface(base::name_id name) const {
+  if (name == scene::sceneExporterInterface()) return const_cast<PLYExporter*>(&m_exporter);
+  return SceneImportPlugin::queryInterface(name);
+}
+
 bool PLYImporter::canImport(std::string_view path) {
   base::Stream stream = base::fs::master().open(path, base::fs::openForReading);
   std::uint8_t byte = 0;

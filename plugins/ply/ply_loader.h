@@ -4,6 +4,7 @@
 #include "b_normal.h"
 #include "b_vec.h"
 #include "ply_columns.h"
+#include "ply_exporter.h"
 #include "ply_parser.h"
 #include "ply_plan.h"
 #include "scene_plugin.h"
@@ -23,7 +24,8 @@ PropertySemantic importedSemantic(const Property& property);
 /// Reads a PLY file into a scene: one mesh (vertex data, one primitive per face, strip or
 /// edge element, all sharing one index list), its materials, a root node and a scene. It is
 /// the body reader's receiver: each element is decided once (plyElement, plyPlan), and the
-/// values then go straight into the mesh's lists.
+/// values then go straight into the mesh's lists. The same object writes scenes: it
+/// answers "ISceneExporter" with its exporter part.
 class PLYImporter final : public scene::SceneImportPlugin {
  public:
   PLYImporter(base::PluginFactory* factory, base::IPluginDesc* descriptor, std::uint32_t index);
@@ -38,6 +40,8 @@ class PLYImporter final : public scene::SceneImportPlugin {
   /// type the factory cannot make and the conversion errors throw; a body that ends early
   /// keeps what was read (with a warning) and the import succeeds.
   bool importScene(base::PluginFactory& factory, std::string_view path) override;
+  /// "ISceneImporter" gives the importer part, "ISceneExporter" the exporter part.
+  base::IPluginInterface* queryInterface(base::name_id name) const override;
 
   // The reader's receiver (ply_parser.h).
   bool plyElement(const Element& element);
@@ -123,6 +127,7 @@ class PLYImporter final : public scene::SceneImportPlugin {
   bool m_importMaterials = true;
   bool m_importPoints = true;
   bool m_importCustomProperties = false;
+  PLYExporter m_exporter{*this};  // reads the parameters the factory copies into this object
   /// Off only for tests that compare the column plans with the per-property path.
   bool m_columnPlans = true;
   /// Whether the stream has a size (then the header bounds every count by the data).

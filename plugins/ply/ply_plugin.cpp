@@ -1,4 +1,5 @@
-// The scene plug-in library: its two entry points and the descriptor of the PLY importer.
+// The scene plug-in library: its two entry points and the descriptor of the PLY importer,
+// whose objects also export.
 
 #include "ply_loader.h"
 #include "scene_schema_registry.h"
@@ -18,7 +19,7 @@ class PlyPluginDesc final : public scene::IScenePluginDesc {
     return new PLYImporter(factory, this, index);
   }
   base::string getImporterExtensions() const override { return "ply;ply.gz"; }
-  base::string getExporterExtensions() const override { return {}; }
+  base::string getExporterExtensions() const override { return "ply"; }
 };
 
 }  // namespace

@@ -12,16 +12,14 @@
 #include <cctype>
 
 namespace scenetool {
-namespace {
 
-// Applies NAME=VALUE entries to the importer's parameters, each read by its parameter's type.
-int applyParameters(const std::vector<std::string>& entries, base::AttribMap& parameters) {
+int applyParameters(const std::vector<std::string>& entries, base::AttribMap& parameters, std::string_view side) {
   for (const std::string& entry : entries) {
     const std::size_t equals = entry.find('=');
     const std::string name = entry.substr(0, equals);
     base::Attribute** slot = name.empty() ? nullptr : parameters.findAttributeMutable(base::intern(name));
     if (equals == std::string::npos || !slot || !*slot) {
-      printError(fmt::format("-p {}: the importer has no parameter '{}'", entry, name));
+      printError(fmt::format("-p {}: the {} has no parameter '{}'", entry, side, name));
       return exitUsage;
     }
     if (!(*slot)->fromString(std::string_view(entry).substr(equals + 1))) {
@@ -31,8 +29,6 @@ int applyParameters(const std::vector<std::string>& entries, base::AttribMap& pa
   }
   return exitOk;
 }
-
-}  // namespace
 
 int readObjectList(const std::string& path, base::PluginFactory& scene) {
   base::Stream file;
@@ -64,7 +60,7 @@ int importScene(scene::SceneFactory& factory, const std::string& path, const std
                              factory.getSupportedExtensions(true)));
       return exitFailed;
     }
-    if (const int applied = applyParameters(entries, parameters); applied != exitOk) return applied;
+    if (const int applied = applyParameters(entries, parameters, "importer"); applied != exitOk) return applied;
     if (factory.load(scene, path, parameters)) return exitOk;
     printError(fmt::format("{}: the file is not one the scene plug-ins read", path));
   } catch (const base::fs::file_not_found&) {

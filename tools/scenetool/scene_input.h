@@ -4,9 +4,14 @@
 #include "scene_factory.h"
 
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace scenetool {
+
+/// Applies NAME=VALUE entries to the parameters of the importer or exporter (`side`), each
+/// read by its parameter's type. Returns exitOk, or exitUsage with the error line printed.
+int applyParameters(const std::vector<std::string>& entries, base::AttribMap& parameters, std::string_view side);
 
 /// Reads the object-list file at `path` into `scene`. Returns an exit code: exitOk, or
 /// exitFailed with the error line printed (naming the file and the cause).

@@ -82,8 +82,9 @@ int run(int argc, const char* const* argv) {
   CLI::App app(description, "scenetool");
   Options options;
   addGlobalOptions(app, options);
-  const std::vector<Command> commands{addImportCommand(app), addPluginsCommand(app), addSchemaCommand(app),
-                                      addPlyCommand(app),    addInfoCommand(app),    addValidateCommand(app)};
+  const std::vector<Command> commands{addImportCommand(app),  addConvertCommand(app), addPluginsCommand(app),
+                                      addSchemaCommand(app),  addPlyCommand(app),     addInfoCommand(app),
+                                      addValidateCommand(app)};
   try {
     app.parse(argc, argv);
   } catch (const CLI::CallForHelp&) {

@@ -30,6 +30,8 @@ struct Command {
 Command addPlyCommand(CLI::App& app);
 /// Registers `scenetool import FILE [-p NAME=VALUE]... [--json] [-o OUT.scene]`.
 Command addImportCommand(CLI::App& app);
+/// Registers `scenetool convert IN OUT [--format ENCODING] [-p NAME=VALUE]...`.
+Command addConvertCommand(CLI::App& app);
 /// Registers `scenetool plugins [--json]`.
 Command addPluginsCommand(CLI::App& app);
 /// Registers `scenetool schema [TYPE] [--json]`.

@@ -97,6 +97,9 @@ class BASE1_API IPlugin : public base::IPlugin {
   virtual ref<IEnum> findFiles(std::string_view pattern) = 0;
   virtual void remove(std::string_view path, bool recursive);
   virtual void rename(std::string_view from, std::string_view to);
+  /// Moves the file `from` to `to`, replacing a file there in one step: a reader of `to`
+  /// finds the old file or the new one, never none. Both lie on one file system.
+  virtual void replace(std::string_view from, std::string_view to);
   virtual void copy(std::string_view from, std::string_view to);
   /// Sets the file's times to now.
   virtual void touch(std::string_view path);
@@ -166,6 +169,7 @@ class BASE1_API MasterFS : public IPlugin {
   ref<IEnum> findFiles(std::string_view pattern) override;
   void remove(std::string_view path, bool recursive) override;
   void rename(std::string_view from, std::string_view to) override;
+  void replace(std::string_view from, std::string_view to) override;
   void copy(std::string_view from, std::string_view to) override;
   void touch(std::string_view path) override;
   void mkdir(std::string_view path) override;

@@ -203,6 +203,13 @@ void MasterFS::rename(std::string_view from, std::string_view to) {
          [&](IPlugin& plugin) { plugin.rename(source, target); });
 }
 
+void MasterFS::replace(std::string_view from, std::string_view to) {
+  const base::string source = aliases().expand(from);
+  const base::string target = aliases().expand(to);
+  modify(m_plugins, canRename, "base::fs::MasterFS::replace", source,
+         [&](IPlugin& plugin) { plugin.replace(source, target); });
+}
+
 void MasterFS::copy(std::string_view from, std::string_view to) {
   const base::string source = aliases().expand(from);
   const base::string target = aliases().expand(to);

@@ -41,6 +41,10 @@ void IPlugin::rename(std::string_view, std::string_view) {
   raise<unsupported_interface>("base::fs::IPlugin::rename", "fs::Plugin::rename");
 }
 
+void IPlugin::replace(std::string_view, std::string_view) {
+  raise<unsupported_interface>("base::fs::IPlugin::replace", "fs::Plugin::replace");
+}
+
 void IPlugin::copy(std::string_view, std::string_view) {
   raise<unsupported_interface>("base::fs::IPlugin::copy", "fs::Plugin::copy");
 }

@@ -220,6 +220,14 @@ TEST_F(SystemFS, ModifyingOperations) {
   // A rename never replaces a file that is there.
   EXPECT_TRUE(thrown<base::api_exception>([&] { system->rename(path("a"), path("b")); }));
   EXPECT_EQ(read("b"), "beta");
+  // A replace does, in one step, and also moves to a name that is free.
+  master.replace(path("made/a3"), path("b"));
+  EXPECT_EQ(read("b"), "alpha");
+  EXPECT_FALSE(stdfs::exists(root / "made/a3"));
+  master.replace(path("b"), path("made/b2"));
+  EXPECT_EQ(read("made/b2"), "alpha");
+  EXPECT_TRUE(thrown<base::exception>([&] { master.replace(path("missing"), path("made/b2")); }));
+  EXPECT_EQ(read("made/b2"), "alpha");
 
   stdfs::last_write_time(root / "a", stdfs::file_time_type::clock::now() - std::chrono::hours(48));
   master.touch(path("a"));

@@ -1,0 +1,143 @@
+#include "ply_exporter.h"
+
+#include "b_exception.h"
+#include "b_fs.h"
+#include "b_log.h"
+#include "b_attrib_array.h"
+#include "ply_mesh_layout.h"
+#include "scene_mesh.h"
+#include "scene_schema.h"
+
+#include <fmt/format.h>
+
+namespace ply {
+namespace {
+
+using scene::sceneExporter_schema;
+
+base::name_id bigEndianParameter() {
+  static const base::name_id name = base::intern("exportBigEndian");
+  return name;
+}
+base::name_id materialsParameter() {
+  static const base::name_id name = base::intern("exportMaterials");
+  return name;
+}
+base::name_id customPropertiesParameter() {
+  static const base::name_id name = base::intern("exportCustomProperties");
+  return name;
+}
+base::name_id mergeParameter() {
+  static const base::name_id name = base::intern("exportMergeMeshes");
+  return name;
+}
+
+bool flag(const base::AttribMap& parameters, base::name_id name, bool otherwise) {
+  const bool* value = parameters.findAttribute<bool>(name);
+  return value ? *value : otherwise;
+}
+
+ExportOptions optionsOf(const base::AttribMap& parameters) {
+  ExportOptions options;
+  const bool binary = flag(parameters, sceneExporter_schema::exportBinary(), true);
+  const bool big = flag(parameters, bigEndianParameter(), false);
+  options.encoding = !binary ? Encoding::ascii : big ? Encoding::binaryBigEndian : Encoding::binaryLittleEndian;
+  options.colors = flag(parameters, sceneExporter_schema::exportColors(), true);
+  options.textureCoordinates = flag(parameters, sceneExporter_schema::exportTextureCoordinates(), true);
+  options.edges = flag(parameters, sceneExporter_schema::exportEdges(), true);
+  options.materials = flag(parameters, materialsParameter(), true);
+  options.customProperties = flag(parameters, customPropertiesParameter(), true);
+  return options;
+}
+
+// Whether the mesh has faces, strips or edges: anything but points.
+bool hasSurface(const base::AttribMap& mesh) {
+  const base::AttribArray* primitives = scene::findArrayMember(mesh, scene::mesh_schema::primitives());
+  for (std::uint32_t k = 0; primitives && k < primitives->size(); ++k) {
+    const base::AttribMap* primitive = scene::mapAt(*primitives, k);
+    if (primitive &&
+        scene::scalarMember<std::uint32_t>(*primitive, scene::meshPrimitive_schema::indexCount()).value_or(0) > 0) {
+      return true;
+    }
+  }
+  return false;
+}
+
+// The path of the k-th file of an export to `path`: `path` itself, then name-1.ply, ...
+std::string pathOf(std::string_view path, std::size_t k) {
+  if (k == 0) return std::string(path);
+  const std::size_t slash = path.find_last_of("/\\");
+  const std::size_t dot = path.find_last_of('.');
+  const std::size_t stem =
+      dot != std::string_view::npos && (slash == std::string_view::npos || dot > slash) ? dot : path.size();
+  return fmt::format("{}-{}{}", path.substr(0, stem), k, path.substr(stem));
+}
+
+// Writes the file under a temporary name beside `path`, then puts it in place: a reader
+// never sees a half-written file under the final name, and a failed write leaves none.
+void writeReplacing(const std::string& path, const std::vector<WriteElement>& elements, Encoding encoding) {
+  const std::string partial = path + ".partial";
+  base::fs::MasterFS& files = base::fs::master();
+  try {
+    {
+      base::Stream file = files.open(partial, base::fs::openWrite | base::fs::openCreate | base::fs::openTruncate);
+      file.flags |= base::throwOnShortWrite;
+      const std::string comments[] = {"written by Meshport"};
+      writePly(file, encoding, elements, comments);
+    }
+    files.replace(partial, path);
+  } catch (const base::exception& error) {
+    try {
+      if (files.fileExists(partial)) files.remove(partial, false);
+    } catch (const base::exception&) {
+      // The write's failure is the one to report.
+    }
+    base::raise<base::exception>("ply::PLYExporter::exportScene",
+                                 fmt::format("{}: cannot write the file: {}", path, error.what()));
+  }
+}
+
+}  // namespace
+
+void PLYExporter::getParameters(base::AttribMap& parameters) {
+  parameters.attribute<bool>(sceneExporter_schema::exportBinary(), true);
+  parameters.attribute<bool>(bigEndianParameter(), false);
+  parameters.attribute<bool>(sceneExporter_schema::exportColors(), true);
+  parameters.attribute<bool>(sceneExporter_schema::exportTextureCoordinates(), true);
+  parameters.attribute<bool>(sceneExporter_schema::exportEdges(), true);
+  parameters.attribute<bool>(sceneExporter_schema::exportPoints(), true);
+  parameters.attribute<bool>(materialsParameter(), true);
+  parameters.attribute<bool>(customPropertiesParameter(), true);
+  parameters.attribute<bool>(mergeParameter(), false);
+  parameters.setMapType(sceneExporter_schema::typeName());
+}
+
+bool PLYExporter::exportScene(base::PluginFactory& scene, std::string_view path) {
+  const ExportOptions options = optionsOf(m_parameters);
+  const bool points = flag(m_parameters, sceneExporter_schema::exportPoints(), true);
+  std::vector<const base::AttribMap*> meshes;
+  for (const base::ref<base::IPlugin>& object : scene.objects()) {
+    if (object && object->mapType() == scene::mesh_schema::typeName() && (points || hasSurface(*object))) {
+      meshes.push_back(object.get());
+    }
+  }
+  if (meshes.empty()) {
+    base::raise<base::exception>("ply::PLYExporter::exportScene",
+                                 fmt::format("{}: the scene holds no mesh to write", path));
+  }
+  for (std::size_t k = 0; k < meshes.size(); ++k) {
+    const std::string target = pathOf(path, k);
+    base::log().message(base::logScene, base::logDebug, "Writing mesh {} to '{}'.", k, target);
+    try {
+      const MeshLayout layout(*meshes[k], options);
+      writeReplacing(target, layout.elements(), options.encoding);
+    } catch (const base::exception& error) {
+      const std::string_view what = error.what();
+      if (what.starts_with(target + ": ")) throw;
+      base::raise<base::exception>("ply::PLYExporter::exportScene", fmt::format("{}: {}", target, what));
+    }
+  }
+  return true;
+}
+
+}  // namespace ply

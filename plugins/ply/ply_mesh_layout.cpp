@@ -1,0 +1,403 @@
+#include "ply_mesh_layout.h"
+
+#include "b_exception.h"
+#include "b_normal.h"
+#include "b_plugin_attribute.h"
+#include "b_vec.h"
+#include "scene_index_delta.h"
+#include "scene_mesh.h"
+#include "scene_schema.h"
+
+#include <fmt/format.h>
+
+#include <algorithm>
+#include <cstring>
+#include <map>
+
+namespace ply {
+namespace {
+
+using scene::mesh_schema;
+using scene::meshColorSet_schema;
+using scene::meshPrimitive_schema;
+using scene::meshUVSet_schema;
+
+constexpr std::uint32_t noIndex = 0xFFFFFFFFu;
+constexpr std::pair<const char*, const char*> uvNames[] = {{"u", "v"}, {"s", "t"}, {"tx", "ty"}};
+constexpr const char* colourPrefixes[] = {"", "ambient_", "diffuse_", "specular_"};
+constexpr const char* channelNames[] = {"red", "green", "blue", "alpha"};
+constexpr const char* singleChannelNames[] = {"opacity", "specular_power"};
+
+// The floats of a list of vectors of floats (null for an empty list).
+template <class V>
+const float* floatsOf(const base::vector<V>& list) {
+  return reinterpret_cast<const float*>(list.data());
+}
+
+[[noreturn]] void refuse(const std::string& why) { base::raise<base::exception>("ply::MeshLayout", why); }
+
+WriteProperty scalar(std::string name, DataType type, const void* data, std::size_t stride, bool normalised = false) {
+  WriteProperty property;
+  property.name = std::move(name);
+  property.type = type;
+  property.values = static_cast<const std::byte*>(data);
+  property.stride = stride;
+  property.normalised = normalised;
+  return property;
+}
+
+// A colour set's values: RGB, RGBA or a single channel (A), `channels` floats an entry.
+struct ColourList {
+  const float* values = nullptr;
+  std::size_t entries = 0;
+  std::uint32_t channels = 0;
+};
+
+ColourList colourListOf(const base::AttribMap& set) {
+  if (const auto* rgb = scene::listMember<base::base_vec3<float>>(set, meshColorSet_schema::RGB())) {
+    return {floatsOf(*rgb), rgb->size(), 3};
+  }
+  if (const auto* rgba = scene::listMember<base::base_vec4<float>>(set, meshColorSet_schema::RGBA())) {
+    return {floatsOf(*rgba), rgba->size(), 4};
+  }
+  if (const auto* a = scene::listMember<float>(set, meshColorSet_schema::A())) return {a->data(), a->size(), 1};
+  return {};
+}
+
+// The channels of one colour list as scalar properties named `names[c]`, each value
+// `stride` floats after the one before; uchar when every value is one.
+void addChannels(WriteElement& element, const float* values, std::size_t entries, std::uint32_t channels,
+                 const std::vector<std::string>& names) {
+  const bool uchar = fitsUchar(values, entries * channels);
+  for (std::uint32_t c = 0; c < channels; ++c) {
+    element.properties.push_back(
+        scalar(names[c], uchar ? DataType::uint8 : DataType::float32, values + c, channels * sizeof(float), uchar));
+  }
+}
+
+std::vector<std::string> colourNames(const char* prefix, std::uint32_t channels) {
+  std::vector<std::string> names;
+  for (std::uint32_t c = 0; c < channels; ++c) names.push_back(std::string(prefix) + channelNames[c]);
+  return names;
+}
+
+// The set's own index channel (per corner), or null for a set of one entry per vertex.
+const base::vector<std::uint32_t>* cornerIndices(const base::AttribMap& set) {
+  return scene::listMember<std::uint32_t>(set, meshUVSet_schema::indices());
+}
+
+// Whether the set's corner channel names an entry for some corner of [start, start + corners).
+bool coversRange(const base::AttribMap& set, std::uint32_t start, std::uint32_t corners) {
+  const base::vector<std::uint32_t>* indices = cornerIndices(set);
+  if (!indices || indices->size() < std::size_t(start) + corners) return false;
+  return std::any_of(indices->begin() + start, indices->begin() + start + corners,
+                     [](std::uint32_t index) { return index != noIndex; });
+}
+
+std::vector<const base::AttribMap*> setsOf(const base::AttribMap& mesh, base::name_id name) {
+  std::vector<const base::AttribMap*> sets;
+  if (const base::AttribArray* array = scene::findArrayMember(mesh, name)) {
+    for (std::uint32_t k = 0; k < array->size(); ++k) {
+      if (const base::AttribMap* set = scene::mapAt(*array, k)) sets.push_back(set);
+    }
+  }
+  return sets;
+}
+
+// The PLY type of a kept list, from its list type's name; none for other lists.
+DataType keptType(base::name_id listType) {
+  static const std::map<std::string_view, DataType> types = {
+      {"int8[]", DataType::int8},     {"uint8[]", DataType::uint8},   {"int16[]", DataType::int16},
+      {"uint16[]", DataType::uint16}, {"int32[]", DataType::int32},   {"uint32[]", DataType::uint32},
+      {"float[]", DataType::float32}, {"double[]", DataType::float64}};
+  const auto found = types.find(base::text(listType));
+  return found == types.end() ? DataType::none : found->second;
+}
+
+}  // namespace
+
+bool fitsUchar(const float* values, std::size_t count) {
+  return std::all_of(values, values + count, [](float value) {
+    const float scaled = value * 255.0f;
+    if (!(scaled >= 0.0f && scaled <= 255.0f)) return false;
+    return static_cast<float>(static_cast<int>(scaled + 0.5f)) * (1.0f / 255.0f) == value;
+  });
+}
+
+template <class T>
+const std::byte* MeshLayout::keep(const std::vector<T>& values) {
+  std::vector<std::byte>& bytes = m_kept.emplace_back(values.size() * sizeof(T));
+  if (!values.empty()) std::memcpy(bytes.data(), values.data(), bytes.size());
+  return bytes.data();
+}
+
+MeshLayout::MeshLayout(const base::AttribMap& mesh, const ExportOptions& options)
+    : m_mesh(mesh), m_indices(scene::decodedIndices(mesh)) {
+  addVertexElement(options);
+  if (const base::AttribArray* primitives = scene::findArrayMember(mesh, mesh_schema::primitives())) {
+    for (std::uint32_t k = 0; k < primitives->size(); ++k) {
+      if (const base::AttribMap* primitive = scene::mapAt(*primitives, k)) addPrimitive(*primitive, options);
+    }
+  }
+  if (options.customProperties) addCustomProperties();
+  if (options.materials) addMaterials();
+}
+
+namespace {
+
+// The vertices' count: the positions', or for a mesh without positions the length of its
+// normals or of the first kept list that is not a face's.
+std::uint64_t vertexCountOf(const base::AttribMap& mesh) {
+  if (const auto* positions = scene::listMember<base::base_vec3<float>>(mesh, mesh_schema::positions())) {
+    return positions->size();
+  }
+  if (const auto* normals = scene::listMember<base::normal>(mesh, mesh_schema::normals())) return normals->size();
+  std::map<std::string_view, const base::Attribute*> kept;
+  for (const auto& [name, member] : mesh.members()) {
+    const std::string_view text = base::text(name);
+    if (text.starts_with("ply:") && !text.starts_with("ply:face.") && !text.ends_with(".items")) {
+      kept.emplace(text, member);
+    }
+  }
+  return kept.empty() ? 0 : kept.begin()->second->size();
+}
+
+}  // namespace
+
+void MeshLayout::addVertexElement(const ExportOptions& options) {
+  m_vertexCount = vertexCountOf(m_mesh);
+  WriteElement vertex{"vertex", m_vertexCount, {}};
+  if (const auto* positions = scene::listMember<base::base_vec3<float>>(m_mesh, mesh_schema::positions())) {
+    for (std::uint32_t c = 0; c < 3; ++c) {
+      vertex.properties.push_back(scalar(std::string(1, "xyz"[c]), DataType::float32, floatsOf(*positions) + c, 12));
+    }
+  }
+  if (const auto* normals = scene::listMember<base::normal>(m_mesh, mesh_schema::normals())) {
+    if (normals->size() != m_vertexCount) {
+      refuse(fmt::format("the mesh has {} normals for {} vertices", normals->size(), m_vertexCount));
+    }
+    for (std::uint32_t c = 0; c < 3; ++c) {
+      vertex.properties.push_back(scalar(fmt::format("n{}", "xyz"[c]), DataType::float32, floatsOf(*normals) + c, 12));
+    }
+  }
+  if (options.textureCoordinates) addVertexUVSets(vertex);
+  if (options.colors) addVertexColourSets(vertex);
+  m_elements.push_back(std::move(vertex));
+}
+
+void MeshLayout::addVertexUVSets(WriteElement& vertex) {
+  std::size_t written = 0;
+  for (const base::AttribMap* set : setsOf(m_mesh, mesh_schema::uvSets())) {
+    const auto* uv = scene::listMember<base::base_vec2<float>>(*set, meshUVSet_schema::UV());
+    if (!uv || cornerIndices(*set)) continue;  // per-corner sets go with their faces
+    if (written == std::size(uvNames)) {
+      refuse("a PLY vertex holds at most three UV sets (u v, s t, tx ty); this mesh has more");
+    }
+    if (uv->size() != m_vertexCount) {
+      refuse(fmt::format("UV set {} has {} entries for {} vertices", written, uv->size(), m_vertexCount));
+    }
+    const auto [u, v] = uvNames[written++];
+    vertex.properties.push_back(scalar(u, DataType::float32, floatsOf(*uv), 8));
+    vertex.properties.push_back(scalar(v, DataType::float32, floatsOf(*uv) + 1, 8));
+  }
+}
+
+void MeshLayout::addVertexColourSets(WriteElement& vertex) {
+  std::size_t colours = 0, singles = 0;
+  for (const base::AttribMap* set : setsOf(m_mesh, mesh_schema::colorSets())) {
+    const ColourList list = colourListOf(*set);
+    if (!list.values && list.channels == 0) continue;
+    if (cornerIndices(*set)) continue;  // per-face colours go with their faces
+    if (list.entries != m_vertexCount) {
+      refuse(fmt::format("a colour set has {} entries for {} vertices", list.entries, m_vertexCount));
+    }
+    if (list.channels == 1) {
+      if (singles == std::size(singleChannelNames)) {
+        refuse("a PLY vertex holds at most two single-channel colour sets (opacity, specular_power)");
+      }
+      addChannels(vertex, list.values, list.entries, 1, {singleChannelNames[singles++]});
+      continue;
+    }
+    if (colours == std::size(colourPrefixes)) {
+      refuse("a PLY vertex holds at most four colour sets (red green blue, then ambient_, diffuse_, specular_)");
+    }
+    addChannels(vertex, list.values, list.entries, list.channels,
+                colourNames(colourPrefixes[colours++], list.channels));
+  }
+}
+
+void MeshLayout::addPrimitive(const base::AttribMap& primitive, const ExportOptions& options) {
+  const std::uint32_t start =
+      scene::scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexStart()).value_or(0);
+  const std::uint32_t corners =
+      scene::scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexCount()).value_or(0);
+  if (std::uint64_t(start) + corners > m_indices.size()) {
+    refuse(fmt::format("a primitive names indices {} to {} of {}", start, std::uint64_t(start) + corners,
+                       m_indices.size()));
+  }
+  if (corners == 0) return;  // points: the vertices say it all
+  WriteProperty indices = scalar("vertex_indices", DataType::int32, m_indices.data() + start, 4);
+  indices.isList = true;
+  if (const auto* strips = scene::listMember<std::uint32_t>(primitive, meshPrimitive_schema::ecounts())) {
+    indices.counts = strips->data();
+    indices.countType = countTypeFor(strips->empty() ? 0 : *std::max_element(strips->begin(), strips->end()));
+    m_elements.push_back(WriteElement{"tristrips", strips->size(), {indices}});
+    return;
+  }
+  const scene::FaceCounts counts = scene::faceCountsOf(primitive);
+  if (counts.uniform == 2) {
+    if (!options.edges) return;
+    indices.length = 2;
+    m_elements.push_back(WriteElement{"edge", corners / 2, {indices}});
+    return;
+  }
+  addFaceElement(primitive, start, corners, options);
+}
+
+void MeshLayout::addFaceElement(const base::AttribMap& primitive, std::uint32_t start, std::uint32_t corners,
+                                const ExportOptions& options) {
+  WriteProperty indices = scalar("vertex_indices", DataType::int32, m_indices.data() + start, 4);
+  indices.isList = true;
+  WriteElement face{"face", 0, {}};
+  const scene::FaceCounts counts = scene::faceCountsOf(primitive);
+  if (counts.perFace) {
+    std::uint64_t total = 0;
+    for (const std::uint16_t n : *counts.perFace) total += n;
+    if (total > corners) refuse(fmt::format("a primitive's faces have {} corners, its range {}", total, corners));
+    indices.counts = reinterpret_cast<const std::uint32_t*>(
+        keep(std::vector<std::uint32_t>(counts.perFace->begin(), counts.perFace->end())));
+    indices.countType =
+        countTypeFor(counts.perFace->empty() ? 0 : *std::max_element(counts.perFace->begin(), counts.perFace->end()));
+    face.count = counts.perFace->size();
+  } else {
+    indices.length = counts.uniform.value_or(3);
+    indices.countType = countTypeFor(indices.length);
+    face.count = indices.length ? corners / indices.length : 0;
+  }
+  face.properties.push_back(indices);
+  // The face element's own data: one texture coordinate list and one colour per face.
+  const std::vector<const base::AttribMap*> uvSets = setsOf(m_mesh, mesh_schema::uvSets());
+  const std::vector<const base::AttribMap*> colourSets = setsOf(m_mesh, mesh_schema::colorSets());
+  std::size_t uvs = 0, colours = 0;
+  for (const base::AttribMap* set : options.textureCoordinates ? uvSets : std::vector<const base::AttribMap*>{}) {
+    if (coversRange(*set, start, corners) && uvs++ == 0) addFaceUVs(face, *set, start, indices);
+  }
+  for (const base::AttribMap* set : options.colors ? colourSets : std::vector<const base::AttribMap*>{}) {
+    if (coversRange(*set, start, corners) && colours++ == 0) addFaceColours(face, *set, start, indices);
+  }
+  if (uvs > 1 || colours > 1) {
+    refuse("a PLY face element holds one texture coordinate list and one colour; these faces have more");
+  }
+  if (m_firstFaceElement == 0) m_firstFaceElement = m_elements.size();
+  m_elements.push_back(std::move(face));
+}
+
+// Each face's corners' coordinates, u and v in turn, as the face's "texcoord" list.
+void MeshLayout::addFaceUVs(WriteElement& face, const base::AttribMap& set, std::uint32_t start,
+                            const WriteProperty& faces) {
+  const auto* uv = scene::listMember<base::base_vec2<float>>(set, meshUVSet_schema::UV());
+  const base::vector<std::uint32_t>& channel = *cornerIndices(set);
+  std::vector<float> coordinates;
+  std::uint64_t corner = start;
+  for (std::uint64_t f = 0; f < face.count; ++f) {
+    const std::uint32_t n = faces.counts ? faces.counts[f] : faces.length;
+    for (std::uint32_t k = 0; k < n; ++k, ++corner) {
+      const std::uint32_t entry = channel[corner];
+      const base::base_vec2<float> value = uv && entry < uv->size() ? (*uv)[entry] : base::base_vec2<float>{};
+      coordinates.push_back(value.x);
+      coordinates.push_back(value.y);
+    }
+  }
+  WriteProperty texcoord = scalar("texcoord", DataType::float32, keep(coordinates), 4);
+  texcoord.isList = true;
+  if (faces.counts) {
+    std::vector<std::uint32_t> lengths(faces.counts, faces.counts + face.count);
+    for (std::uint32_t& length : lengths) length *= 2;
+    texcoord.counts = reinterpret_cast<const std::uint32_t*>(keep(lengths));
+    texcoord.countType = countTypeFor(lengths.empty() ? 0 : *std::max_element(lengths.begin(), lengths.end()));
+  } else {
+    texcoord.length = 2 * faces.length;
+    texcoord.countType = countTypeFor(texcoord.length);
+  }
+  face.properties.push_back(texcoord);
+}
+
+// Each face's colour, the entry its first corner names, as red green blue [alpha].
+void MeshLayout::addFaceColours(WriteElement& face, const base::AttribMap& set, std::uint32_t start,
+                                const WriteProperty& faces) {
+  const ColourList list = colourListOf(set);
+  if (list.channels < 3) return;  // a single channel has no per-face name
+  const base::vector<std::uint32_t>& channel = *cornerIndices(set);
+  std::vector<float> colours;
+  std::uint64_t corner = start;
+  for (std::uint64_t f = 0; f < face.count; ++f) {
+    const std::uint32_t entry = channel[corner];
+    for (std::uint32_t c = 0; c < list.channels; ++c) {
+      colours.push_back(entry < list.entries ? list.values[std::size_t(entry) * list.channels + c] : 0.0f);
+    }
+    corner += faces.counts ? faces.counts[f] : faces.length;
+  }
+  const auto* values = reinterpret_cast<const float*>(keep(colours));
+  addChannels(face, values, face.count, list.channels, colourNames("", list.channels));
+}
+
+void MeshLayout::addCustomProperties() {
+  std::map<std::string_view, const base::Attribute*> kept;
+  for (const auto& [name, member] : m_mesh.members()) {
+    if (base::text(name).starts_with("ply:")) kept.emplace(base::text(name), member);
+  }
+  for (const auto& [fullName, member] : kept) {
+    if (fullName.ends_with(".items")) continue;  // with its counts
+    std::string_view name = fullName.substr(4);
+    const bool list = name.ends_with(".counts");
+    if (list) name.remove_suffix(7);
+    const base::Attribute* items = member;
+    if (list) {
+      const auto found = kept.find(std::string(fullName.substr(0, fullName.size() - 7)) + ".items");
+      if (found == kept.end() || member->type() != base::TypeTraits<base::vector<std::uint32_t>>::n_name) continue;
+      items = found->second;
+    }
+    const DataType type = keptType(items->type());
+    if (type == DataType::none) continue;
+    // A kept face property says so in its name when a vertex property took the plain one;
+    // otherwise its length tells.
+    const bool faceNamed = name.starts_with("face.");
+    if (faceNamed) name.remove_prefix(5);
+    const std::uint64_t instances = member->size();
+    WriteElement* element = &m_elements.front();
+    if (faceNamed || instances != m_vertexCount) {
+      if (m_firstFaceElement == 0 || m_elements[m_firstFaceElement].count != instances) {
+        refuse(fmt::format("kept property {} has {} entries: as many as neither the vertices nor the faces", fullName,
+                           instances));
+      }
+      element = &m_elements[m_firstFaceElement];
+    }
+    WriteProperty property = scalar(std::string(name), type, items->data(0), dataTypeSize(type));
+    if (list) {
+      const auto* counts = static_cast<const base::vector<std::uint32_t>*>(member->data());
+      std::uint64_t total = 0;
+      for (const std::uint32_t n : *counts) total += n;
+      if (total != items->size()) refuse(fmt::format("kept property {}: its counts and items disagree", fullName));
+      property.isList = true;
+      property.counts = counts->data();
+      property.countType = countTypeFor(counts->empty() ? 0 : *std::max_element(counts->begin(), counts->end()));
+    }
+    element->properties.push_back(property);
+  }
+}
+
+void MeshLayout::addMaterials() {
+  std::vector<const base::IPlugin*> materials;
+  for (const base::AttribMap* primitive : setsOf(m_mesh, mesh_schema::primitives())) {
+    const auto* named = scene::listMember<base::ref<base::IPlugin>>(*primitive, meshPrimitive_schema::materials());
+    for (const base::ref<base::IPlugin>& material : named ? *named : base::vector<base::ref<base::IPlugin>>{}) {
+      if (material && material->mapType() == scene::principalMaterial_schema::typeName() &&
+          std::find(materials.begin(), materials.end(), material.get()) == materials.end()) {
+        materials.push_back(material.get());
+      }
+    }
+  }
+  if (!materials.empty()) m_elements.push_back(materialElement(materials, m_kept));
+}
+
+}  // namespace ply

@@ -1,0 +1,73 @@
+#pragma once
+
+#include "b_attribute_map.h"
+#include "b_plugin.h"
+#include "ply_writer.h"
+
+#include <deque>
+#include <string>
+#include <vector>
+
+namespace ply {
+
+/// What a PLY export writes of a mesh.
+struct ExportOptions {
+  Encoding encoding = Encoding::binaryLittleEndian;
+  bool colors = true;              ///< vertex and per-face colour sets
+  bool textureCoordinates = true;  ///< vertex and per-face UV sets
+  bool edges = true;               ///< primitives of two-corner faces, as an edge element
+  bool materials = true;           ///< the materials the primitives name
+  bool customProperties = true;    ///< the importer's kept "ply:" lists
+};
+
+/// A mesh laid out as PLY elements: a vertex element (positions, normals, UV and colour
+/// sets, kept vertex properties), a face, tristrips or edge element per primitive (decoded
+/// indices, per-face texture coordinates and colours, kept face properties) and a material
+/// element. The elements point into the mesh and into what the layout computed, so both
+/// must outlive the writing. A mesh that PLY cannot hold as it is (a fourth UV set, lists
+/// of another length than their element's) throws base::exception saying why.
+class MeshLayout {
+ public:
+  MeshLayout(const base::AttribMap& mesh, const ExportOptions& options);
+  MeshLayout(const MeshLayout&) = delete;
+  MeshLayout& operator=(const MeshLayout&) = delete;
+
+  const std::vector<WriteElement>& elements() const { return m_elements; }
+
+ private:
+  struct FaceSets;
+
+  void addVertexElement(const ExportOptions& options);
+  void addVertexUVSets(WriteElement& vertex);
+  void addVertexColourSets(WriteElement& vertex);
+  void addPrimitive(const base::AttribMap& primitive, const ExportOptions& options);
+  void addFaceElement(const base::AttribMap& primitive, std::uint32_t start, std::uint32_t corners,
+                      const ExportOptions& options);
+  void addFaceUVs(WriteElement& face, const base::AttribMap& set, std::uint32_t start, const WriteProperty& faces);
+  void addFaceColours(WriteElement& face, const base::AttribMap& set, std::uint32_t start, const WriteProperty& faces);
+  void addCustomProperties();
+  void addMaterials();
+  /// A copy of `values` that lives as long as the layout, for the elements to point at.
+  template <class T>
+  const std::byte* keep(const std::vector<T>& values);
+
+  const base::AttribMap& m_mesh;
+  std::vector<WriteElement> m_elements;
+  std::uint64_t m_vertexCount = 0;
+  std::size_t m_firstFaceElement = 0;     ///< index in m_elements; 0 when there is none
+  base::vector<std::uint32_t> m_indices;  ///< decoded
+  std::deque<std::vector<std::byte>> m_kept;
+};
+
+/// The PLY element of `materials` (principalMaterial objects), through the inverse of the
+/// import's conversion: `color` to diffuse_*, `reflectionAmount` to a grey specular_*
+/// colour that gives it back, `roughness` to specular_power, `visibilityMap` to opacity.
+/// `storage` keeps the element's values.
+WriteElement materialElement(const std::vector<const base::IPlugin*>& materials,
+                             std::deque<std::vector<std::byte>>& storage);
+
+/// Whether every value is k/255 for an integer k, as the import's normalisation of a
+/// uchar gives it: such values are written as uchar, others as float.
+bool fitsUchar(const float* values, std::size_t count);
+
+}  // namespace ply

@@ -1,0 +1,363 @@
+// The PLY exporter through the scene factory, as a host uses it: parameters, the round trip
+// of every test and corpus file in every encoding (import, export, import: the same scene),
+// and what happens around the file (replacing, failing, several meshes, no mesh).
+
+#include "b_attribute_desc.h"
+#include "b_color.h"
+#include "b_normal.h"
+#include "b_vec.h"
+#include "log_capture.h"
+#include "ply_recorder.h"
+#include "scene_import.h"
+#include "thrown.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cmath>
+#include <cstring>
+#include <filesystem>
+#include <fstream>
+#include <map>
+#include <optional>
+#include <sstream>
+
+namespace {
+
+namespace stdfs = std::filesystem;
+using scene::mesh_schema;
+using scene::meshColorSet_schema;
+using scene::meshPrimitive_schema;
+using scene::meshUVSet_schema;
+using testing_support::ImportedScene;
+using testing_support::importFile;
+
+constexpr const char* encodings[] = {"ascii", "binary_little_endian", "binary_big_endian"};
+
+// A fresh folder for the files one test writes.
+class ExportFolder {
+ public:
+  ExportFolder() : m_path(std::string(base::fs::tmpFilename())) {
+    stdfs::remove(m_path);
+    stdfs::create_directory(m_path);
+  }
+  ~ExportFolder() { stdfs::remove_all(m_path); }
+  std::string file(const std::string& name) const { return (m_path / name).string(); }
+  std::vector<std::string> names() const {
+    std::vector<std::string> found;
+    for (const auto& entry : stdfs::directory_iterator(m_path)) found.push_back(entry.path().filename().string());
+    std::sort(found.begin(), found.end());
+    return found;
+  }
+
+ private:
+  stdfs::path m_path;
+};
+
+// Exports `scene` to `path` with the exporter's defaults and `entries` (NAME=VALUE).
+bool exportScene(const ImportedScene& imported, const std::string& path, const std::vector<std::string>& entries = {}) {
+  base::AttribMap parameters;
+  scene::SceneFactory& factory = testing_support::pluginFactory();
+  EXPECT_TRUE(factory.getExporterParameters(path, parameters));
+  for (const std::string& entry : entries) {
+    const std::size_t equals = entry.find('=');
+    base::Attribute** slot = parameters.findAttributeMutable(base::intern(entry.substr(0, equals)));
+    EXPECT_TRUE(slot && *slot && (*slot)->fromString(entry.substr(equals + 1))) << entry;
+  }
+  return factory.save(*imported.scene, path, parameters);
+}
+
+std::vector<std::string> formatEntries(const std::string& encoding) {
+  if (encoding == "ascii") return {"exportBinary=false"};
+  return {"exportBinary=true", encoding == "binary_big_endian" ? "exportBigEndian=true" : "exportBigEndian=false"};
+}
+
+// A list member in its structured form, or none: floats are written so that they read back
+// to the same bits, so equal texts are equal lists.
+std::optional<std::string> listOf(const base::AttribMap& map, base::name_id name) {
+  const base::Attribute* member = map.findMember(name);
+  if (!member || !base::text(member->type()).ends_with("[]")) return std::nullopt;
+  base::JsonWriter writer;
+  member->writeValue(writer);
+  return std::string(writer.text());
+}
+
+// The bytes of one entry of a list.
+std::size_t entryBytes(const base::Attribute& list) {
+  if (list.size() >= 2) {
+    return static_cast<std::size_t>(static_cast<const char*>(list.data(1)) - static_cast<const char*>(list.data(0)));
+  }
+  return list.byteSize() - 4;
+}
+
+std::vector<const base::AttribMap*> mapsOf(const base::AttribMap& map, base::name_id name) {
+  std::vector<const base::AttribMap*> maps;
+  const base::AttribArray* array = scene::findArrayMember(map, name);
+  for (std::uint32_t k = 0; array && k < array->size(); ++k) maps.push_back(scene::mapAt(*array, k));
+  return maps;
+}
+
+// A set's value for one corner: its own channel names the entry, else the corner's vertex.
+std::string cornerValue(const base::AttribMap& set, base::name_id layout, std::uint32_t corner, std::uint32_t vertex) {
+  const base::Attribute* list = set.findMember(layout);
+  if (!list || list->size() == 0) return {};
+  const base::vector<std::uint32_t>* channel = scene::listMember<std::uint32_t>(set, meshUVSet_schema::indices());
+  const std::uint32_t entry = channel ? (*channel)[corner] : vertex;
+  if (entry >= list->size()) return "none";
+  return std::string(static_cast<const char*>(list->data(static_cast<int>(entry))), entryBytes(*list));
+}
+
+// Every face of a primitive as its corners (vertex and each set's value), rotated to start at
+// its smallest corner, the faces sorted: faces equal as a multiset up to rotation.
+std::vector<std::vector<std::string>> facesOf(const base::AttribMap& mesh, const base::AttribMap& primitive) {
+  const base::vector<std::uint32_t> indices = scene::decodedIndices(mesh);
+  const std::uint32_t start =
+      scene::scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexStart()).value_or(0);
+  const std::uint32_t count =
+      scene::scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexCount()).value_or(0);
+  std::vector<std::uint32_t> sizes;
+  if (const auto* strips = scene::listMember<std::uint32_t>(primitive, meshPrimitive_schema::ecounts())) {
+    sizes.assign(strips->begin(), strips->end());
+  } else if (const scene::FaceCounts counts = scene::faceCountsOf(primitive); counts.perFace) {
+    sizes.assign(counts.perFace->begin(), counts.perFace->end());
+  } else if (counts.uniform && *counts.uniform > 0) {
+    sizes.assign(count / *counts.uniform, *counts.uniform);
+  }
+  std::vector<std::vector<std::string>> faces;
+  std::uint32_t corner = start;
+  for (const std::uint32_t n : sizes) {
+    std::vector<std::string> face;
+    for (std::uint32_t k = 0; k < n; ++k, ++corner) {
+      std::string value = std::to_string(indices[corner]);
+      for (const base::AttribMap* set : mapsOf(mesh, mesh_schema::uvSets())) {
+        if (scene::listMember<std::uint32_t>(*set, meshUVSet_schema::indices())) {
+          value += '|';
+          value += cornerValue(*set, meshUVSet_schema::UV(), corner, indices[corner]);
+        }
+      }
+      for (const base::AttribMap* set : mapsOf(mesh, mesh_schema::colorSets())) {
+        if (scene::listMember<std::uint32_t>(*set, meshColorSet_schema::indices())) {
+          for (const base::name_id layout : {meshColorSet_schema::RGB(), meshColorSet_schema::RGBA()}) {
+            value += '|';
+            value += cornerValue(*set, layout, corner, indices[corner]);
+          }
+        }
+      }
+      face.push_back(value);
+    }
+    if (!sizes.empty() && primitive.findMember(meshPrimitive_schema::ecounts()) == nullptr && !face.empty()) {
+      std::rotate(face.begin(),
+                  std::min_element(face.begin(), face.end(),
+                                   [](const auto& a, const auto& b) { return std::stoul(a) < std::stoul(b); }),
+                  face.end());
+    }
+    faces.push_back(face);
+  }
+  std::sort(faces.begin(), faces.end());
+  return faces;
+}
+
+// What the export keeps of a material, through the inverse of the import's conversion.
+std::map<std::string, std::string> materialOf(const base::IPlugin& material) {
+  std::map<std::string, std::string> kept;
+  for (const base::name_id name :
+       {scene::principalMaterial_schema::color(), scene::principalMaterial_schema::roughness(),
+        scene::principalMaterial_schema::visibilityMap(), scene::principalMaterial_schema::reflectionAmount()}) {
+    if (const base::Attribute* member = material.findMember(name))
+      kept[std::string(base::text(name))] = member->toString();
+  }
+  return kept;
+}
+
+std::vector<std::map<std::string, std::string>> materialsOf(const ImportedScene& imported) {
+  std::vector<std::map<std::string, std::string>> materials;
+  for (const auto& object : imported.scene->objects()) {
+    if (object && object->mapType() == scene::principalMaterial_schema::typeName())
+      materials.push_back(materialOf(*object));
+  }
+  return materials;
+}
+
+// The two imports hold the same scene: every list of the mesh bit for bit (vertex lists,
+// vertex sets, kept properties), the faces as a multiset, the primitives' kinds and materials.
+void expectSameScene(const ImportedScene& before, const ImportedScene& after, const std::string& what) {
+  const base::AttribMap& a = before.mesh();
+  const base::AttribMap& b = after.mesh();
+  for (const base::name_id name : {mesh_schema::positions(), mesh_schema::normals()}) {
+    EXPECT_EQ(listOf(a, name), listOf(b, name)) << what << ": " << base::text(name);
+  }
+  for (const base::name_id sets : {mesh_schema::uvSets(), mesh_schema::colorSets()}) {
+    const auto setsA = mapsOf(a, sets), setsB = mapsOf(b, sets);
+    ASSERT_EQ(setsA.size(), setsB.size()) << what << ": " << base::text(sets);
+    for (std::size_t k = 0; k < setsA.size(); ++k) {
+      if (scene::listMember<std::uint32_t>(*setsA[k], meshUVSet_schema::indices())) continue;  // by corner, below
+      for (const base::name_id layout : {meshUVSet_schema::UV(), meshColorSet_schema::RGB(),
+                                         meshColorSet_schema::RGBA(), meshColorSet_schema::A()}) {
+        EXPECT_EQ(listOf(*setsA[k], layout), listOf(*setsB[k], layout)) << what << ": set " << k;
+      }
+    }
+  }
+  for (const auto& [name, member] : a.members()) {
+    if (base::text(name).starts_with("ply:")) {
+      EXPECT_EQ(listOf(a, name), listOf(b, name)) << what << ": " << base::text(name);
+    }
+  }
+  const auto primitivesA = mapsOf(a, mesh_schema::primitives()), primitivesB = mapsOf(b, mesh_schema::primitives());
+  ASSERT_EQ(primitivesA.size(), primitivesB.size()) << what;
+  for (std::size_t k = 0; k < primitivesA.size(); ++k) {
+    EXPECT_EQ(facesOf(a, *primitivesA[k]), facesOf(b, *primitivesB[k])) << what << ": primitive " << k;
+  }
+  EXPECT_EQ(materialsOf(before), materialsOf(after)) << what;
+}
+
+std::vector<std::string> roundTripFiles() {
+  std::vector<std::string> files;
+  for (const auto& entry : stdfs::directory_iterator(MESHPORT_TEST_DATA "/ply/valid"))
+    files.push_back(entry.path().string());
+  const stdfs::path corpus = stdfs::path(MESHPORT_CORPUS) / "files";
+  if (stdfs::is_directory(corpus)) {
+    for (const auto& entry : stdfs::directory_iterator(corpus)) files.push_back(entry.path().string());
+  }
+  std::sort(files.begin(), files.end());
+  return files;
+}
+
+class RoundTrip : public testing::TestWithParam<std::string> {};
+
+TEST_P(RoundTrip, ImportExportImportGivesTheSameSceneInEveryEncoding) {
+  testing_support::LogCapture log;
+  for (const bool custom : {false, true}) {
+    ImportedScene first;
+    try {
+      first = importFile(GetParam(), true, {{"importCustomProperties", custom}});
+    } catch (const base::exception&) {
+      continue;  // files the importer refuses
+    }
+    if (!first.loaded || !first.first(mesh_schema::typeName())) continue;
+    const ExportFolder folder;
+    std::vector<std::string> recordings;
+    for (const std::string encoding : encodings) {
+      const std::string path = folder.file(encoding + ".ply");
+      ASSERT_TRUE(exportScene(first, path, formatEntries(encoding))) << encoding;
+      const ImportedScene second = importFile(path, true, {{"importCustomProperties", custom}});
+      ASSERT_TRUE(second.loaded) << encoding;
+      expectSameScene(first, second, encoding + (custom ? ", custom properties kept" : ""));
+      // What a raw reader sees is the same whatever the encoding.
+      std::ifstream in(path, std::ios::binary);
+      testing_support::PlyRecorder recorder;
+      ply::Header header;
+      ASSERT_EQ(testing_support::readPly(std::string(std::istreambuf_iterator<char>(in), {}), recorder, header),
+                ply::ReadResult::complete);
+      std::string all;
+      for (const std::string& line : recorder.instances) all += line + "\n";
+      recordings.push_back(all);
+    }
+    EXPECT_EQ(recordings[0], recordings[1]);
+    EXPECT_EQ(recordings[1], recordings[2]);
+    EXPECT_EQ(folder.names(),
+              (std::vector<std::string>{"ascii.ply", "binary_big_endian.ply", "binary_little_endian.ply"}));
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(Files, RoundTrip, testing::ValuesIn(roundTripFiles()), [](const auto& info) {
+  std::string name = stdfs::path(info.param).stem().string();
+  std::replace_if(
+      name.begin(), name.end(), [](char c) { return !std::isalnum(static_cast<unsigned char>(c)); }, '_');
+  return name;
+});
+
+TEST(PlyExport, ParametersAndTheirDefaults) {
+  base::AttribMap parameters;
+  ASSERT_TRUE(testing_support::pluginFactory().getExporterParameters("out.ply", parameters));
+  EXPECT_EQ(parameters.mapType(), scene::sceneExporter_schema::typeName());
+  EXPECT_EQ(parameters.size(), 9u);
+  for (const char* on : {"exportBinary", "exportColors", "exportTextureCoordinates", "exportEdges", "exportPoints",
+                         "exportMaterials", "exportCustomProperties"}) {
+    EXPECT_TRUE(*parameters.findAttribute<bool>(base::intern(on))) << on;
+  }
+  EXPECT_FALSE(*parameters.findAttribute<bool>(base::intern("exportBigEndian")));
+  EXPECT_FALSE(*parameters.findAttribute<bool>(base::intern("exportMergeMeshes")));
+}
+
+std::string readText(const std::string& path) {
+  std::ifstream in(path, std::ios::binary);
+  return std::string(std::istreambuf_iterator<char>(in), {});
+}
+
+TEST(PlyExport, SwitchedOffPartsAreLeftOut) {
+  const ImportedScene imported = importFile(MESHPORT_TEST_DATA "/ply/valid/ascii_tetrahedron_normals_colors.ply");
+  const ExportFolder folder;
+  ASSERT_TRUE(exportScene(imported, folder.file("plain.ply"), {"exportBinary=false", "exportColors=false"}));
+  const std::string text = readText(folder.file("plain.ply"));
+  EXPECT_EQ(text.find("red"), std::string::npos) << text;
+  EXPECT_NE(text.find("property float nx"), std::string::npos) << text;
+  EXPECT_NE(text.find("comment written by Meshport\n"), std::string::npos);
+}
+
+TEST(PlyExport, AFaceOfMoreThan255CornersGetsAWiderCount) {
+  std::string file = testing_support::asciiHeader +
+                     "element vertex 300\nproperty float x\nproperty float y\n"
+                     "element face 1\nproperty list uchar int vertex_indices\nend_header\n";
+  for (int k = 0; k < 300; ++k) file += fmt::format("{} {}\n", std::cos(k * 0.02), std::sin(k * 0.02));
+  // uchar counts up to 255: the reader takes the count's word as it is, 300 included.
+  file += "300";
+  for (int k = 0; k < 300; ++k) file += fmt::format(" {}", k);
+  file += "\n";
+  const testing_support::TemporaryFile source("big_face.ply", file);
+  const ImportedScene imported = importFile(source.path());
+  const ExportFolder folder;
+  for (const std::string encoding : encodings) {
+    const std::string path = folder.file(encoding + ".ply");
+    ASSERT_TRUE(exportScene(imported, path, formatEntries(encoding)));
+    EXPECT_NE(readText(path).find("property list ushort int vertex_indices\n"), std::string::npos);
+    expectSameScene(imported, importFile(path), encoding);
+  }
+}
+
+TEST(PlyExport, AnExistingFileIsReplacedOnlyByAWholeOne) {
+  const ImportedScene imported = importFile(MESHPORT_TEST_DATA "/ply/valid/binary_le_cube_triangles.ply");
+  const ExportFolder folder;
+  const std::string path = folder.file("cube.ply");
+  std::ofstream(path) << "old content";
+  ASSERT_TRUE(exportScene(imported, path));
+  EXPECT_EQ(readText(path).substr(0, 4), "ply\n");
+  expectSameScene(imported, importFile(path), "replaced");
+  EXPECT_EQ(folder.names(), std::vector<std::string>{"cube.ply"});
+}
+
+TEST(PlyExport, AFailedWriteNamesTheFileAndLeavesNothingBehind) {
+  testing_support::LogCapture log;
+  const ImportedScene imported = importFile(MESHPORT_TEST_DATA "/ply/valid/binary_le_cube_triangles.ply");
+  const ExportFolder folder;
+  // No such folder, and a folder where the file should be.
+  const std::string missing = folder.file("missing/cube.ply");
+  const std::string text = stream_tests::thrownText([&] { exportScene(imported, missing); });
+  EXPECT_EQ(text.rfind(missing + ": cannot write the file: ", 0), 0u) << text;
+  stdfs::create_directory(folder.file("taken.ply"));
+  const std::string taken = folder.file("taken.ply");
+  EXPECT_EQ(stream_tests::thrownText([&] { exportScene(imported, taken); }).rfind(taken + ": cannot write the file", 0),
+            0u);
+  EXPECT_TRUE(stdfs::is_directory(taken));
+  EXPECT_EQ(folder.names(), std::vector<std::string>{"taken.ply"});
+}
+
+TEST(PlyExport, ASceneWithoutMeshesSaysSo) {
+  const ImportedScene empty;
+  const ExportFolder folder;
+  const std::string path = folder.file("empty.ply");
+  EXPECT_EQ(stream_tests::thrownText([&] { exportScene(empty, path); }), path + ": the scene holds no mesh to write");
+  EXPECT_TRUE(folder.names().empty());
+}
+
+TEST(PlyExport, SeveralMeshesGoToOneFileEach) {
+  ImportedScene two = importFile(MESHPORT_TEST_DATA "/ply/valid/binary_le_cube_triangles.ply");
+  ASSERT_TRUE(testing_support::pluginFactory().load(*two.scene, MESHPORT_TEST_DATA "/ply/valid/ascii_cube_quads.ply",
+                                                    base::AttribMap()));
+  const ExportFolder folder;
+  ASSERT_TRUE(exportScene(two, folder.file("scene.ply")));
+  EXPECT_EQ(folder.names(), (std::vector<std::string>{"scene-1.ply", "scene.ply"}));
+  expectSameScene(importFile(MESHPORT_TEST_DATA "/ply/valid/ascii_cube_quads.ply"),
+                  importFile(folder.file("scene-1.ply")), "second mesh");
+}
+
+}  // namespace
