@@ -1,9 +1,9 @@
 #include "ply_exporter.h"
 
+#include "b_attrib_array.h"
 #include "b_exception.h"
 #include "b_fs.h"
 #include "b_log.h"
-#include "b_attrib_array.h"
 #include "ply_mesh_layout.h"
 #include "scene_mesh.h"
 #include "scene_schema.h"
@@ -124,6 +124,17 @@ bool PLYExporter::exportScene(base::PluginFactory& scene, std::string_view path)
   if (meshes.empty()) {
     base::raise<base::exception>("ply::PLYExporter::exportScene",
                                  fmt::format("{}: the scene holds no mesh to write", path));
+  }
+  // One file per mesh unless asked: each file then holds its mesh as it is, whatever the
+  // others hold, and a scene of one mesh (every PLY import gives one) writes exactly `path`.
+  std::unique_ptr<base::AttribMap> merged;
+  if (meshes.size() > 1 && flag(m_parameters, mergeParameter(), false)) {
+    try {
+      merged = mergedMesh(meshes);
+    } catch (const base::exception& error) {
+      base::raise<base::exception>("ply::PLYExporter::exportScene", fmt::format("{}: {}", path, error.what()));
+    }
+    meshes = {merged.get()};
   }
   for (std::size_t k = 0; k < meshes.size(); ++k) {
     const std::string target = pathOf(path, k);

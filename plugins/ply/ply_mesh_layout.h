@@ -5,6 +5,7 @@
 #include "ply_writer.h"
 
 #include <deque>
+#include <memory>
 #include <string>
 #include <vector>
 
@@ -65,6 +66,12 @@ class MeshLayout {
 /// `storage` keeps the element's values.
 WriteElement materialElement(const std::vector<const base::IPlugin*>& materials,
                              std::deque<std::vector<std::byte>>& storage);
+
+/// Several meshes as one: their vertex lists end to end, their primitives one after the
+/// other with the indices moved past the vertices before them (decoded, not delta-encoded).
+/// Meshes that differ in their vertex lists or sets, or that have per-face data, throw
+/// base::exception saying why.
+std::unique_ptr<base::AttribMap> mergedMesh(const std::vector<const base::AttribMap*>& meshes);
 
 /// Whether every value is k/255 for an integer k, as the import's normalisation of a
 /// uchar gives it: such values are written as uchar, others as float.

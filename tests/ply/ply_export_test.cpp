@@ -360,4 +360,37 @@ TEST(PlyExport, SeveralMeshesGoToOneFileEach) {
                   importFile(folder.file("scene-1.ply")), "second mesh");
 }
 
+TEST(PlyExport, SeveralMeshesOfOneLayoutGoToOneFileWhenAsked) {
+  const std::string triangles = MESHPORT_TEST_DATA "/ply/valid/binary_le_cube_triangles.ply";
+  const std::string quads = MESHPORT_TEST_DATA "/ply/valid/ascii_cube_quads.ply";
+  ImportedScene two = importFile(triangles);
+  ASSERT_TRUE(testing_support::pluginFactory().load(*two.scene, quads, base::AttribMap()));
+  const ExportFolder folder;
+  ASSERT_TRUE(exportScene(two, folder.file("scene.ply"), {"exportMergeMeshes=true"}));
+  EXPECT_EQ(folder.names(), std::vector<std::string>{"scene.ply"});
+  const ImportedScene merged = importFile(folder.file("scene.ply"));
+  const auto& positions = testing_support::list<base::base_vec3<float>>(merged.mesh(), mesh_schema::positions());
+  const ImportedScene alone = importFile(triangles);
+  const auto& first = testing_support::list<base::base_vec3<float>>(alone.mesh(), mesh_schema::positions());
+  ASSERT_EQ(positions.size(), 16u);
+  EXPECT_TRUE(std::equal(first.begin(), first.end(), positions.begin()));
+  ASSERT_EQ(testing_support::arraySize(merged.mesh(), mesh_schema::primitives()), 2u);
+  // The second mesh's faces name the vertices after the first mesh's.
+  const auto faces = facesOf(merged.mesh(), merged.primitive(1));
+  ASSERT_EQ(faces.size(), 6u);
+  for (const auto& face : faces) {
+    for (const std::string& corner : face) EXPECT_GE(std::stoul(corner), 8u);
+  }
+
+  // Meshes of different layouts stay apart, and say why.
+  ImportedScene mixed = importFile(triangles);
+  ASSERT_TRUE(testing_support::pluginFactory().load(
+      *mixed.scene, MESHPORT_TEST_DATA "/ply/valid/ascii_tetrahedron_normals_colors.ply", base::AttribMap()));
+  const std::string path = folder.file("mixed.ply");
+  EXPECT_EQ(stream_tests::thrownText([&] {
+              exportScene(mixed, path, {"exportMergeMeshes=true"});
+            }).rfind(path + ": the meshes cannot go into one file: ", 0),
+            0u);
+}
+
 }  // namespace
