@@ -198,4 +198,14 @@ base::vector<std::uint32_t> meshIndices() {
   return indices;
 }
 
+scene::SceneFactory& plugins() {
+  static scene::SceneFactory factory;
+  static const bool loaded = [] {
+    factory.reloadPlugins();
+    return true;
+  }();
+  static_cast<void>(loaded);
+  return factory;
+}
+
 }  // namespace bench

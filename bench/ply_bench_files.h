@@ -1,6 +1,7 @@
 #pragma once
 
 #include "b_containers.h"
+#include "scene_factory.h"
 
 #include <cstdint>
 #include <string>
@@ -17,6 +18,9 @@ enum class Encoding { ascii, little, big };
 
 /// The path of the file, writing it first when it is not there yet.
 std::string plyFile(Shape shape, Encoding encoding);
+
+/// The scene factory with the plug-ins beside the program, loaded once.
+scene::SceneFactory& plugins();
 
 /// The mesh's face indices in the file's order, three per triangle.
 base::vector<std::uint32_t> meshIndices();

@@ -25,16 +25,6 @@ using bench::Encoding;
 using bench::Shape;
 using Clock = std::chrono::steady_clock;
 
-scene::SceneFactory& plugins() {
-  static scene::SceneFactory factory;
-  static const bool loaded = [] {
-    factory.reloadPlugins();
-    return true;
-  }();
-  static_cast<void>(loaded);
-  return factory;
-}
-
 // The phases of one import, ended by these debug messages of the reader and the importer;
 // the last one ends when load returns.
 constexpr std::array<std::string_view, 3> phaseEnds = {"Begin parsing the ply elements.", "Encoding the index deltas.",
@@ -102,7 +92,7 @@ void BM_PlyImport(benchmark::State& state, Shape shape, Encoding encoding) {
   // A splat cloud is imported with all its fields.
   base::AttribMap parameters;
   if (shape == Shape::splat) parameters.attribute(base::intern("importCustomProperties"), true);
-  plugins();  // loaded once, before the clock runs, as a host loads them at start-up
+  bench::plugins();  // loaded once, before the clock runs, as a host loads them at start-up
   PhaseClock phases;
   std::array<double, 4> totals{};
   double peak = 0, kept = 0;
@@ -116,7 +106,7 @@ void BM_PlyImport(benchmark::State& state, Shape shape, Encoding encoding) {
     state.ResumeTiming();
 #endif
     phases.start();
-    if (!plugins().load(*sceneFactory, path, parameters)) state.SkipWithError("import failed");
+    if (!bench::plugins().load(*sceneFactory, path, parameters)) state.SkipWithError("import failed");
     phases.finish(totals);
 #ifdef __linux__
     state.PauseTiming();
@@ -143,7 +133,7 @@ void BM_DeltaEncode(benchmark::State& state, Shape shape) {
   base::ref<base::PluginFactory> sceneFactory(new base::PluginFactory("scene"));
   scene::register_scene_schema(*sceneFactory);
   base::AttribMap parameters;
-  plugins().load(*sceneFactory, path, parameters);
+  bench::plugins().load(*sceneFactory, path, parameters);
   base::IPlugin& mesh = *sceneFactory->object(0);
   const base::vector<std::uint32_t> inFileOrder = bench::meshIndices();
   for (auto _ : state) {

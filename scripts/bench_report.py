@@ -121,6 +121,18 @@ def import_table(runs):
     return rows
 
 
+def export_table(runs):
+    rows = ["| encoding | export | rate | one fwrite of the same bytes | export / floor |", "|---|---|---|---|---|"]
+    for key, title in [("little", "binary little-endian"), ("big", "binary big-endian"), ("ascii", "ASCII")]:
+        total, floor = get(runs, f"BM_PlyExport/mesh_{key}"), get(runs, f"BM_FloorWrite/mesh_{key}")
+        if total is None:
+            continue
+        rate = get(runs, f"BM_PlyExport/mesh_{key}", "bytes_per_second")
+        rows.append(f"| mesh, {title} | {ms(total)} | {rate / 1e6:.0f} MB/s | {ms(floor)} | "
+                    f"{ratio(total / floor if floor else None)} |")
+    return rows
+
+
 def per_byte_table(runs):
     mesh = get(runs, "BM_PlyImport/mesh_little", "bytes_per_second")
     rows = ["| file | rate | time per byte against the binary mesh (target) |", "|---|---|---|"]
@@ -171,6 +183,7 @@ def main():
         "### The reader into plain columns", "", *reader_table(runs), "",
         "### The whole import", "", *import_table(runs), "",
         "### Per-face data and kept properties", "", *per_byte_table(runs), "",
+        "### Writing", "", *export_table(runs), "",
         "### Reading the file", "", *file_access_table(runs), "",
         "### The reference importer", "", *assimp_table(runs), "",
         "### scenetool as a whole process", "", *process_table(runs, sys.argv[2]),
