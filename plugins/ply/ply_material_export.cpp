@@ -45,8 +45,9 @@ std::optional<T> memberOf(const base::IPlugin& material, base::name_id name) {
 
 // A float column of the element: `count` values, written as uchar when every one is k/255.
 void addColumn(WriteElement& element, const char* name, const std::vector<float>& values, std::uint32_t channels,
-               std::deque<std::vector<std::byte>>& storage) {
-  std::vector<std::byte>& bytes = storage.emplace_back(values.size() * sizeof(float));
+               KeptStorage& storage) {
+  std::vector<std::byte>& bytes = storage.emplace_back().bytes;
+  bytes.resize(values.size() * sizeof(float));
   if (!values.empty()) std::memcpy(bytes.data(), values.data(), bytes.size());
   const auto* floats = reinterpret_cast<const float*>(bytes.data());
   const bool uchar = fitsUchar(floats, values.size());
@@ -67,8 +68,7 @@ void addColumn(WriteElement& element, const char* name, const std::vector<float>
 
 }  // namespace
 
-WriteElement materialElement(const std::vector<const base::IPlugin*>& materials,
-                             std::deque<std::vector<std::byte>>& storage) {
+WriteElement materialElement(const std::vector<const base::IPlugin*>& materials, KeptStorage& storage) {
   std::vector<float> diffuse, specular, power, opacity;
   bool hasColour = false, hasReflection = false, hasRoughness = false, hasVisibility = false;
   for (const base::IPlugin* material : materials) {

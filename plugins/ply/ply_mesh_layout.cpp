@@ -12,7 +12,6 @@
 
 #include <algorithm>
 #include <cstring>
-#include <map>
 
 namespace ply {
 namespace {
@@ -106,12 +105,36 @@ std::vector<const base::AttribMap*> setsOf(const base::AttribMap& mesh, base::na
 
 // The PLY type of a kept list, from its list type's name; none for other lists.
 DataType keptType(base::name_id listType) {
-  static const std::map<std::string_view, DataType> types = {
-      {"int8[]", DataType::int8},     {"uint8[]", DataType::uint8},   {"int16[]", DataType::int16},
-      {"uint16[]", DataType::uint16}, {"int32[]", DataType::int32},   {"uint32[]", DataType::uint32},
-      {"float[]", DataType::float32}, {"double[]", DataType::float64}};
-  const auto found = types.find(base::text(listType));
-  return found == types.end() ? DataType::none : found->second;
+  struct TypeName {
+    std::string_view name;
+    DataType type;
+  };
+  static constexpr TypeName types[] = {{"int8[]", DataType::int8},     {"uint8[]", DataType::uint8},
+                                       {"int16[]", DataType::int16},   {"uint16[]", DataType::uint16},
+                                       {"int32[]", DataType::int32},   {"uint32[]", DataType::uint32},
+                                       {"float[]", DataType::float32}, {"double[]", DataType::float64}};
+  const std::string_view text = base::text(listType);
+  for (const TypeName& entry : types) {
+    if (entry.name == text) return entry.type;
+  }
+  return DataType::none;
+}
+
+// The mesh's kept lists ("ply:" members), sorted by name. A type of this file's own, so that
+// the containers made of it stay inside the plug-in.
+struct KeptList {
+  std::string_view name;
+  const base::Attribute* member;
+  bool operator<(const KeptList& other) const { return name < other.name; }
+};
+
+std::vector<KeptList> keptListsOf(const base::AttribMap& mesh) {
+  std::vector<KeptList> kept;
+  for (const auto& [name, member] : mesh.members()) {
+    if (base::text(name).starts_with("ply:")) kept.push_back({base::text(name), member});
+  }
+  std::sort(kept.begin(), kept.end());
+  return kept;
 }
 
 }  // namespace
@@ -126,7 +149,8 @@ bool fitsUchar(const float* values, std::size_t count) {
 
 template <class T>
 const std::byte* MeshLayout::keep(const std::vector<T>& values) {
-  std::vector<std::byte>& bytes = m_kept.emplace_back(values.size() * sizeof(T));
+  std::vector<std::byte>& bytes = m_kept.emplace_back().bytes;
+  bytes.resize(values.size() * sizeof(T));
   if (!values.empty()) std::memcpy(bytes.data(), values.data(), bytes.size());
   return bytes.data();
 }
@@ -152,14 +176,10 @@ std::uint64_t vertexCountOf(const base::AttribMap& mesh) {
     return positions->size();
   }
   if (const auto* normals = scene::listMember<base::normal>(mesh, mesh_schema::normals())) return normals->size();
-  std::map<std::string_view, const base::Attribute*> kept;
-  for (const auto& [name, member] : mesh.members()) {
-    const std::string_view text = base::text(name);
-    if (text.starts_with("ply:") && !text.starts_with("ply:face.") && !text.ends_with(".items")) {
-      kept.emplace(text, member);
-    }
+  for (const KeptList& kept : keptListsOf(mesh)) {
+    if (!kept.name.starts_with("ply:face.") && !kept.name.ends_with(".items")) return kept.member->size();
   }
-  return kept.empty() ? 0 : kept.begin()->second->size();
+  return 0;
 }
 
 }  // namespace
@@ -342,10 +362,7 @@ void MeshLayout::addFaceColours(WriteElement& face, const base::AttribMap& set, 
 }
 
 void MeshLayout::addCustomProperties() {
-  std::map<std::string_view, const base::Attribute*> kept;
-  for (const auto& [name, member] : m_mesh.members()) {
-    if (base::text(name).starts_with("ply:")) kept.emplace(base::text(name), member);
-  }
+  const std::vector<KeptList> kept = keptListsOf(m_mesh);
   for (const auto& [fullName, member] : kept) {
     if (fullName.ends_with(".items")) continue;  // with its counts
     std::string_view name = fullName.substr(4);
@@ -353,9 +370,11 @@ void MeshLayout::addCustomProperties() {
     if (list) name.remove_suffix(7);
     const base::Attribute* items = member;
     if (list) {
-      const auto found = kept.find(std::string(fullName.substr(0, fullName.size() - 7)) + ".items");
+      const std::string itemsName = std::string(fullName.substr(0, fullName.size() - 7)) + ".items";
+      const auto found =
+          std::find_if(kept.begin(), kept.end(), [&](const KeptList& list) { return list.name == itemsName; });
       if (found == kept.end() || member->type() != base::TypeTraits<base::vector<std::uint32_t>>::n_name) continue;
-      items = found->second;
+      items = found->member;
     }
     const DataType type = keptType(items->type());
     if (type == DataType::none) continue;

@@ -11,6 +11,14 @@
 
 namespace ply {
 
+/// Values an export computed (decoded counts, per-corner coordinates, per-face colours),
+/// kept for the elements that point at them. A type of the plug-in's own, so that the
+/// container made of it stays inside the plug-in.
+struct KeptValues {
+  std::vector<std::byte> bytes;
+};
+using KeptStorage = std::deque<KeptValues>;
+
 /// What a PLY export writes of a mesh.
 struct ExportOptions {
   Encoding encoding = Encoding::binaryLittleEndian;
@@ -57,15 +65,14 @@ class MeshLayout {
   std::uint64_t m_vertexCount = 0;
   std::size_t m_firstFaceElement = 0;     ///< index in m_elements; 0 when there is none
   base::vector<std::uint32_t> m_indices;  ///< decoded
-  std::deque<std::vector<std::byte>> m_kept;
+  KeptStorage m_kept;
 };
 
 /// The PLY element of `materials` (principalMaterial objects), through the inverse of the
 /// import's conversion: `color` to diffuse_*, `reflectionAmount` to a grey specular_*
 /// colour that gives it back, `roughness` to specular_power, `visibilityMap` to opacity.
 /// `storage` keeps the element's values.
-WriteElement materialElement(const std::vector<const base::IPlugin*>& materials,
-                             std::deque<std::vector<std::byte>>& storage);
+WriteElement materialElement(const std::vector<const base::IPlugin*>& materials, KeptStorage& storage);
 
 /// Several meshes as one: their vertex lists end to end, their primitives one after the
 /// other with the indices moved past the vertices before them (decoded, not delta-encoded).
