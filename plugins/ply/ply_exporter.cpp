@@ -15,21 +15,16 @@ namespace {
 
 using scene::sceneExporter_schema;
 
-base::name_id bigEndianParameter() {
-  static const base::name_id name = base::intern("exportBigEndian");
-  return name;
-}
-base::name_id materialsParameter() {
-  static const base::name_id name = base::intern("exportMaterials");
-  return name;
-}
-base::name_id customPropertiesParameter() {
-  static const base::name_id name = base::intern("exportCustomProperties");
-  return name;
-}
-base::name_id mergeParameter() {
-  static const base::name_id name = base::intern("exportMergeMeshes");
-  return name;
+// The exporter's own parameters, beside the schema's; interned once.
+struct OwnParameters {
+  base::name_id bigEndian = base::intern("exportBigEndian");
+  base::name_id materials = base::intern("exportMaterials");
+  base::name_id customProperties = base::intern("exportCustomProperties");
+  base::name_id mergeMeshes = base::intern("exportMergeMeshes");
+};
+const OwnParameters& own() {
+  static const OwnParameters names;
+  return names;
 }
 
 bool flag(const base::AttribMap& parameters, base::name_id name, bool otherwise) {
@@ -40,13 +35,13 @@ bool flag(const base::AttribMap& parameters, base::name_id name, bool otherwise)
 ExportOptions optionsOf(const base::AttribMap& parameters) {
   ExportOptions options;
   const bool binary = flag(parameters, sceneExporter_schema::exportBinary(), true);
-  const bool big = flag(parameters, bigEndianParameter(), false);
+  const bool big = flag(parameters, own().bigEndian, false);
   options.encoding = !binary ? Encoding::ascii : big ? Encoding::binaryBigEndian : Encoding::binaryLittleEndian;
   options.colors = flag(parameters, sceneExporter_schema::exportColors(), true);
   options.textureCoordinates = flag(parameters, sceneExporter_schema::exportTextureCoordinates(), true);
   options.edges = flag(parameters, sceneExporter_schema::exportEdges(), true);
-  options.materials = flag(parameters, materialsParameter(), true);
-  options.customProperties = flag(parameters, customPropertiesParameter(), true);
+  options.materials = flag(parameters, own().materials, true);
+  options.customProperties = flag(parameters, own().customProperties, true);
   return options;
 }
 
@@ -101,14 +96,14 @@ void writeReplacing(const std::string& path, const std::vector<WriteElement>& el
 
 void PLYExporter::getParameters(base::AttribMap& parameters) {
   parameters.attribute<bool>(sceneExporter_schema::exportBinary(), true);
-  parameters.attribute<bool>(bigEndianParameter(), false);
+  parameters.attribute<bool>(own().bigEndian, false);
   parameters.attribute<bool>(sceneExporter_schema::exportColors(), true);
   parameters.attribute<bool>(sceneExporter_schema::exportTextureCoordinates(), true);
   parameters.attribute<bool>(sceneExporter_schema::exportEdges(), true);
   parameters.attribute<bool>(sceneExporter_schema::exportPoints(), true);
-  parameters.attribute<bool>(materialsParameter(), true);
-  parameters.attribute<bool>(customPropertiesParameter(), true);
-  parameters.attribute<bool>(mergeParameter(), false);
+  parameters.attribute<bool>(own().materials, true);
+  parameters.attribute<bool>(own().customProperties, true);
+  parameters.attribute<bool>(own().mergeMeshes, false);
   parameters.setMapType(sceneExporter_schema::typeName());
 }
 
@@ -128,7 +123,7 @@ bool PLYExporter::exportScene(base::PluginFactory& scene, std::string_view path)
   // One file per mesh unless asked: each file then holds its mesh as it is, whatever the
   // others hold, and a scene of one mesh (every PLY import gives one) writes exactly `path`.
   std::unique_ptr<base::AttribMap> merged;
-  if (meshes.size() > 1 && flag(m_parameters, mergeParameter(), false)) {
+  if (meshes.size() > 1 && flag(m_parameters, own().mergeMeshes, false)) {
     try {
       merged = mergedMesh(meshes);
     } catch (const base::exception& error) {

@@ -103,23 +103,6 @@ std::vector<const base::AttribMap*> setsOf(const base::AttribMap& mesh, base::na
   return sets;
 }
 
-// The PLY type of a kept list, from its list type's name; none for other lists.
-DataType keptType(base::name_id listType) {
-  struct TypeName {
-    std::string_view name;
-    DataType type;
-  };
-  static constexpr TypeName types[] = {{"int8[]", DataType::int8},     {"uint8[]", DataType::uint8},
-                                       {"int16[]", DataType::int16},   {"uint16[]", DataType::uint16},
-                                       {"int32[]", DataType::int32},   {"uint32[]", DataType::uint32},
-                                       {"float[]", DataType::float32}, {"double[]", DataType::float64}};
-  const std::string_view text = base::text(listType);
-  for (const TypeName& entry : types) {
-    if (entry.name == text) return entry.type;
-  }
-  return DataType::none;
-}
-
 // The mesh's kept lists ("ply:" members), sorted by name. A type of this file's own, so that
 // the containers made of it stay inside the plug-in.
 struct KeptList {
@@ -138,6 +121,22 @@ std::vector<KeptList> keptListsOf(const base::AttribMap& mesh) {
 }
 
 }  // namespace
+
+DataType keptListType(base::name_id listType) {
+  struct TypeName {
+    std::string_view name;
+    DataType type;
+  };
+  static constexpr TypeName types[] = {{"int8[]", DataType::int8},     {"uint8[]", DataType::uint8},
+                                       {"int16[]", DataType::int16},   {"uint16[]", DataType::uint16},
+                                       {"int32[]", DataType::int32},   {"uint32[]", DataType::uint32},
+                                       {"float[]", DataType::float32}, {"double[]", DataType::float64}};
+  const std::string_view text = base::text(listType);
+  for (const TypeName& entry : types) {
+    if (entry.name == text) return entry.type;
+  }
+  return DataType::none;
+}
 
 bool fitsUchar(const float* values, std::size_t count) {
   return std::all_of(values, values + count, [](float value) {
@@ -376,7 +375,7 @@ void MeshLayout::addCustomProperties() {
       if (found == kept.end() || member->type() != base::TypeTraits<base::vector<std::uint32_t>>::n_name) continue;
       items = found->member;
     }
-    const DataType type = keptType(items->type());
+    const DataType type = keptListType(items->type());
     if (type == DataType::none) continue;
     // A kept face property says so in its name when a vertex property took the plain one;
     // otherwise its length tells.

@@ -80,6 +80,10 @@ WriteElement materialElement(const std::vector<const base::IPlugin*>& materials,
 /// base::exception saying why.
 std::unique_ptr<base::AttribMap> mergedMesh(const std::vector<const base::AttribMap*>& meshes);
 
+/// The PLY type of a list of numbers that the importer keeps ("float[]" gives float32),
+/// from the list's type name; none for other lists.
+DataType keptListType(base::name_id listType);
+
 /// Whether every value is k/255 for an integer k, as the import's normalisation of a
 /// uchar gives it: such values are written as uchar, others as float.
 bool fitsUchar(const float* values, std::size_t count);

@@ -7,6 +7,7 @@
 #include "b_exception.h"
 #include "b_normal.h"
 #include "b_vec.h"
+#include "ply_columns.h"
 #include "ply_mesh_layout.h"
 #include "scene_index_delta.h"
 #include "scene_mesh.h"
@@ -81,25 +82,13 @@ void mergeKept(base::AttribMap& merged, const std::vector<const base::AttribMap*
   for (const auto& [name, member] : meshes.front()->members()) {
     if (!base::text(name).starts_with("ply:")) continue;
     const auto* positions = scene::listMember<base::base_vec3<float>>(*meshes.front(), mesh_schema::positions());
-    if (!positions || member->size() != positions->size())
+    if (!positions || member->size() != positions->size()) {
       refuse(fmt::format("{} is no per-vertex list", base::text(name)));
-    const std::string_view type = base::text(member->type());
-    if (type == "int8[]")
-      concatenate<std::int8_t>(merged, name, meshes);
-    else if (type == "uint8[]")
-      concatenate<std::uint8_t>(merged, name, meshes);
-    else if (type == "int16[]")
-      concatenate<std::int16_t>(merged, name, meshes);
-    else if (type == "uint16[]")
-      concatenate<std::uint16_t>(merged, name, meshes);
-    else if (type == "int32[]")
-      concatenate<std::int32_t>(merged, name, meshes);
-    else if (type == "uint32[]")
-      concatenate<std::uint32_t>(merged, name, meshes);
-    else if (type == "float[]")
-      concatenate<float>(merged, name, meshes);
-    else if (type == "double[]")
-      concatenate<double>(merged, name, meshes);
+    }
+    detail::forType<Conversion::native>(keptListType(member->type()), [&]<DataType T, Conversion>() {
+      concatenate<detail::NativeType<T>>(merged, name, meshes);
+      return true;
+    });
   }
 }
 
