@@ -33,6 +33,9 @@ const float* floatsOf(const base::vector<V>& list) {
   return reinterpret_cast<const float*>(list.data());
 }
 
+// Component `c` of the first entry of `values`; null when there are none, as nothing is read.
+const float* component(const float* values, std::uint32_t c) { return values ? values + c : nullptr; }
+
 [[noreturn]] void refuse(const std::string& why) { base::raise<base::exception>("ply::MeshLayout", why); }
 
 WriteProperty scalar(std::string name, DataType type, const void* data, std::size_t stride, bool normalised = false) {
@@ -69,8 +72,8 @@ void addChannels(WriteElement& element, const float* values, std::size_t entries
                  const std::vector<std::string>& names) {
   const bool uchar = fitsUchar(values, entries * channels);
   for (std::uint32_t c = 0; c < channels; ++c) {
-    element.properties.push_back(
-        scalar(names[c], uchar ? DataType::uint8 : DataType::float32, values + c, channels * sizeof(float), uchar));
+    element.properties.push_back(scalar(names[c], uchar ? DataType::uint8 : DataType::float32, component(values, c),
+                                        channels * sizeof(float), uchar));
   }
 }
 
@@ -188,7 +191,8 @@ void MeshLayout::addVertexElement(const ExportOptions& options) {
   WriteElement vertex{"vertex", m_vertexCount, {}};
   if (const auto* positions = scene::listMember<base::base_vec3<float>>(m_mesh, mesh_schema::positions())) {
     for (std::uint32_t c = 0; c < 3; ++c) {
-      vertex.properties.push_back(scalar(std::string(1, "xyz"[c]), DataType::float32, floatsOf(*positions) + c, 12));
+      vertex.properties.push_back(
+          scalar(std::string(1, "xyz"[c]), DataType::float32, component(floatsOf(*positions), c), 12));
     }
   }
   if (const auto* normals = scene::listMember<base::normal>(m_mesh, mesh_schema::normals())) {
@@ -196,7 +200,8 @@ void MeshLayout::addVertexElement(const ExportOptions& options) {
       refuse(fmt::format("the mesh has {} normals for {} vertices", normals->size(), m_vertexCount));
     }
     for (std::uint32_t c = 0; c < 3; ++c) {
-      vertex.properties.push_back(scalar(fmt::format("n{}", "xyz"[c]), DataType::float32, floatsOf(*normals) + c, 12));
+      vertex.properties.push_back(
+          scalar(fmt::format("n{}", "xyz"[c]), DataType::float32, component(floatsOf(*normals), c), 12));
     }
   }
   if (options.textureCoordinates) addVertexUVSets(vertex);
@@ -217,7 +222,7 @@ void MeshLayout::addVertexUVSets(WriteElement& vertex) {
     }
     const auto [u, v] = uvNames[written++];
     vertex.properties.push_back(scalar(u, DataType::float32, floatsOf(*uv), 8));
-    vertex.properties.push_back(scalar(v, DataType::float32, floatsOf(*uv) + 1, 8));
+    vertex.properties.push_back(scalar(v, DataType::float32, component(floatsOf(*uv), 1), 8));
   }
 }
 

@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <charconv>
 #include <cmath>
+#include <cstring>
 
 namespace ply {
 namespace {
@@ -66,6 +67,15 @@ void storeColumn(const std::byte* source, std::size_t sourceStride, std::size_t 
   }
 }
 
+// An integer's digits. fmt's formatter rather than std::to_chars, whose integer templates a
+// build without inlining would export from the plug-in. A char is a number here, not a
+// character.
+char* integerText(std::int64_t value, char* out) {
+  const fmt::format_int text(value);
+  std::memcpy(out, text.data(), text.size());
+  return out + text.size();
+}
+
 template <DataType W, bool Normalised>
 char* formatValue(const std::byte* source, char* out) {
   const auto value = valueAt<W, Normalised>(source);
@@ -74,8 +84,7 @@ char* formatValue(const std::byte* source, char* out) {
     // included; the reader takes both.
     return std::to_chars(out, out + wordRoom, value).ptr;
   } else {
-    // A char is a number here, not a character.
-    return std::to_chars(out, out + wordRoom, static_cast<std::int64_t>(value)).ptr;
+    return integerText(static_cast<std::int64_t>(value), out);
   }
 }
 
@@ -244,7 +253,7 @@ void writeAscii(Output& output, const WriteElement& element) {
       const std::uint32_t length = lengthOf(property, i);
       const std::size_t room = wordRoom * (std::size_t(length) + 1);
       char* out = reinterpret_cast<char*>(output.room(room));
-      char* end = std::to_chars(separated(out, first), out + room, length).ptr;
+      char* end = integerText(length, separated(out, first));
       const std::byte* item = property.values + itemAt[p] * property.stride;
       for (std::uint32_t k = 0; k < length; ++k, item += property.stride) {
         *end++ = ' ';
