@@ -85,8 +85,9 @@ void mergeKept(base::AttribMap& merged, const std::vector<const base::AttribMap*
     if (!positions || member->size() != positions->size()) {
       refuse(fmt::format("{} is no per-vertex list", base::text(name)));
     }
+    const base::name_id list = name;  // a lambda may not name a structured binding in every compiler
     detail::forType<Conversion::native>(keptListType(member->type()), [&]<DataType T, Conversion>() {
-      concatenate<detail::NativeType<T>>(merged, name, meshes);
+      concatenate<detail::NativeType<T>>(merged, list, meshes);
       return true;
     });
   }
