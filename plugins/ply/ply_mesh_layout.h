@@ -44,8 +44,6 @@ class MeshLayout {
   const std::vector<WriteElement>& elements() const { return m_elements; }
 
  private:
-  struct FaceSets;
-
   void addVertexElement(const ExportOptions& options);
   void addVertexUVSets(WriteElement& vertex);
   void addVertexColourSets(WriteElement& vertex);

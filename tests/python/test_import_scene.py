@@ -129,7 +129,7 @@ def test_failures_raise_the_modules_exceptions(tmp_path, write_ply):
     other.write_text("1 2 3\n")
     with pytest.raises(meshport.UnsupportedError, match="mesh.xyz: no scene plug-in imports this kind of file"):
         meshport.import_scene(other)
-    with pytest.raises(meshport.CorruptError, match="bad.ply: Invalid .ply file: Missing format specification"):
+    with pytest.raises(meshport.CorruptError, match="bad.ply: Invalid .ply file: Missing format"):
         meshport.import_scene(write_ply("bad.ply", b"ply\nelement vertex 1\nend_header\n"))
 
 
