@@ -66,11 +66,10 @@ class AsciiBody {
         readPlanned(element, receiver);
         m_report.finish(element);
       } else {
-        readInstances(element, [&](std::uint32_t i) {
-          if (deliver) receiver.beginInstance(i);
-          return readInstance(element, deliver, receiver);
-        });
+        readInstances(element, receiver, deliver,
+                      [&](std::uint32_t) { return readInstance(element, deliver, receiver); });
       }
+      m_skipped.finish(element);
     }
     return !m_ended;
   }
@@ -79,20 +78,22 @@ class AsciiBody {
   enum class Status { ok, invalid, ended };
 
   // An instance that cannot be read has its line skipped; the end of the data ends the body.
-  template <class ReadOne>
-  void readInstances(const Element& element, ReadOne readOne) {
+  // Each instance is begun with the receiver when `begins`, and a begun instance that could
+  // not be read whole is dropped with it.
+  template <class R, class ReadOne>
+  void readInstances(const Element& element, R& receiver, bool begins, ReadOne readOne) {
     for (std::uint32_t i = 0; i < element.count; ++i) {
+      if (begins) receiver.beginInstance(i);
       const Status status = readOne(i);
+      if (status == Status::ok) continue;
+      if (begins) dropInstance(receiver, i);
       if (status == Status::ended) {
         m_ended = true;
         warnEndedEarly(element, i);
         return;
       }
-      if (status == Status::invalid) {
-        base::log().message(base::logScene, base::logWarning,
-                            "Unable to parse property instance. Skipping this element instance");
-        skipLine(m_window);
-      }
+      m_skipped.note();
+      skipLine(m_window);
     }
   }
 
@@ -171,10 +172,8 @@ class AsciiBody {
     }
     PlanTargets targets(m_plan, element.count, m_window.remaining().has_value());
     m_count = element.count;
-    const bool delivers = m_plan.delivers();
-    readInstances(element, [&](std::uint32_t i) {
+    readInstances(element, receiver, m_plan.delivers() || DropsInstances<R>, [&](std::uint32_t i) {
       targets.reach(std::uint64_t(i) + 1);
-      if (delivers) receiver.beginInstance(i);
       return readPlannedInstance(element, i, targets, receiver);
     });
   }
@@ -258,6 +257,7 @@ class AsciiBody {
   std::uint32_t m_count = 0;  ///< instances of the planned element
   base::vector<std::uint32_t> m_items;
   BadIndexReport m_report;
+  SkippedLineReport m_skipped;
 };
 
 }  // namespace ply::detail

@@ -45,8 +45,10 @@ class BinaryBody {
     for (std::uint32_t i = 0; i < element.count; ++i) {
       receiver.beginInstance(i);
       for (const Property& property : element.properties) {
-        if (!deliverProperty(element, property, receiver))
+        if (!deliverProperty(element, property, receiver)) {
+          dropInstance(receiver, i);
           return failed("Unable to parse property instance.", element, i);
+        }
       }
     }
     return true;
@@ -194,6 +196,7 @@ class BinaryBody {
         continue;
       }
       if (!readPlannedInstance(element, i, targets, delivers, receiver)) {
+        if (delivers || DropsInstances<R>) dropInstance(receiver, static_cast<std::uint32_t>(i));
         return failed("Unable to parse property instance.", element, i);
       }
       ++i;
@@ -370,7 +373,7 @@ class BinaryBody {
   template <class R>
   bool readPlannedInstance(const Element& element, std::uint64_t i, PlanTargets& targets, bool delivers, R& receiver) {
     targets.reach(i + 1);
-    if (delivers) receiver.beginInstance(static_cast<std::uint32_t>(i));
+    if (delivers || DropsInstances<R>) receiver.beginInstance(static_cast<std::uint32_t>(i));
     for (const Step& step : m_steps) {
       if (!readPlannedProperty(element, step, i, targets, receiver)) return false;
     }

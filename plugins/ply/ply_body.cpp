@@ -7,6 +7,22 @@ void warnEndedEarly(const Element& element, std::uint64_t read) {
                       base::clipped(displayName(element)), read, element.count);
 }
 
+void SkippedLineReport::note() {
+  if (++m_count <= linesPerElement) {
+    base::log().message(base::logScene, base::logWarning,
+                        "Unable to parse property instance. Skipping this element instance");
+  }
+}
+
+void SkippedLineReport::finish(const Element& element) {
+  if (m_count > 0) {
+    base::log().message(base::logScene, base::logWarning,
+                        "Element '{}': {} of {} instances could not be parsed; their lines were skipped",
+                        base::clipped(displayName(element)), m_count, element.count);
+  }
+  m_count = 0;
+}
+
 BinaryPlan::BinaryPlan(const Element& element) {
   std::uint32_t offset = 0;
   for (const Property& property : element.properties) {

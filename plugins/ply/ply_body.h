@@ -24,6 +24,34 @@ bool parseHeader(Header& header, ByteWindow& window, base::Stream& stream);
 /// Logs that the data ended inside `element` after `read` complete instances.
 void warnEndedEarly(const Element& element, std::uint64_t read);
 
+/// Whether a receiver wants to hear of instances that could not be read whole.
+template <class R>
+concept DropsInstances = requires(R& receiver, std::uint32_t index) {
+  receiver.dropInstance(index);
+};
+
+/// Tells a receiver that wants to hear of it that instance `index`, begun with
+/// beginInstance, could not be read whole.
+template <class R>
+void dropInstance(R& receiver, std::uint32_t index) {
+  if constexpr (DropsInstances<R>) receiver.dropInstance(index);
+}
+
+/// Reports ASCII instances whose line could not be parsed and was skipped: the first few
+/// with their own line, then, when the element ends, one line with the element's name and
+/// the counts, so that a file of many bad lines neither floods the log nor hides how many.
+class SkippedLineReport {
+ public:
+  static constexpr std::uint64_t linesPerElement = 10;
+
+  void note();
+  /// Logs the total, if any, and starts over.
+  void finish(const Element& element);
+
+ private:
+  std::uint64_t m_count = 0;
+};
+
 /// One binary value of `type` at `bytes`, byte-swapped when `Swap`; the member written is
 /// the one the type reads from.
 template <bool Swap>

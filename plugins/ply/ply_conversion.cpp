@@ -107,27 +107,37 @@ bool PLYImporter::plyElement(const Element& element) {
   m_element = &element;
   m_targets.clear();
   m_routes.assign(element.properties.size(), Route{});
+  m_dropped.clear();
+  m_elementCustomLists = m_customLists.size();
+  bool wanted = false;
   switch (element.semantic) {
     case ElementSemantic::vertex:
-      return prepareVertices(element);
+      wanted = prepareVertices(element);
+      break;
     case ElementSemantic::face:
     case ElementSemantic::tristrips:
     case ElementSemantic::edge:
-      return prepareIndices(element);
+      wanted = prepareIndices(element);
+      break;
     case ElementSemantic::material:
       prepareMaterials(element);
-      return true;
+      wanted = true;
+      break;
     case ElementSemantic::unknown:
       break;
   }
-  return false;
+  m_marksInstances = m_primitive || m_customLists.size() > m_elementCustomLists;
+  return wanted;
 }
 
 void PLYImporter::finishElement() {
   if (!m_element) return;
   m_badIndices.finish(*m_element);
-  evenTargets();
-  finishFaceData();
+  if (m_primitive && m_vcountsList) {
+    spreadOverFaces();
+  } else {
+    evenTargets();
+  }
   if (m_primitive) {
     m_primitive->attribute<std::uint32_t>(meshPrimitive_schema::indexCount(),
                                           static_cast<std::uint32_t>(m_indicesList->size()) - m_primitiveStart);
@@ -319,8 +329,11 @@ bool PLYImporter::prepareIndices(const Element& element) {
       m_primitive->attribute<std::uint16_t>(meshPrimitive_schema::vcounts(), 2);
     }
   }
+  m_listsPerInstance = 0;
   for (std::size_t p = 0; p < element.properties.size(); ++p) {
-    if (element.properties[p].semantic == PropertySemantic::vertexIndex) m_routes[p].kind = Route::Kind::indices;
+    if (element.properties[p].semantic != PropertySemantic::vertexIndex) continue;
+    m_routes[p].kind = Route::Kind::indices;
+    ++m_listsPerInstance;
   }
   if (faces) {
     prepareFaceData(element);
@@ -387,6 +400,50 @@ void PLYImporter::plyProperty(const Element& element, const Property& property, 
       if (!values.empty()) storeMaterialValue(property, toFP(values[0], property));
       return;
   }
+}
+
+void PLYImporter::markInstance() {
+  if (m_primitive) {
+    m_mark.indices = m_indicesList->size();
+    m_mark.faceCounts = m_vcountsList ? m_vcountsList->size() : 0;
+    m_mark.runCounts = m_ecountsList ? m_ecountsList->size() : 0;
+  }
+  if (m_faceUVSet) {
+    m_mark.items = m_faceItems.size();
+    m_mark.itemCounts = m_faceItemCounts.size();
+  }
+  for (std::size_t k = m_elementCustomLists; k < m_customLists.size(); ++k) {
+    m_customLists[k].countsMark = m_customLists[k].counts->size();
+    m_customLists[k].itemsMark = m_customLists[k].items.size();
+  }
+}
+
+void PLYImporter::dropInstance(std::uint32_t index) {
+  if (m_primitive) {
+    m_indicesList->resize(m_mark.indices);
+    if (m_vcountsList) m_vcountsList->resize(m_mark.faceCounts);
+    if (m_ecountsList) m_ecountsList->resize(m_mark.runCounts);
+  }
+  // Lists of values per instance keep the instance's place with an empty list, so that they
+  // stay in step with the values stored by instance number.
+  if (m_faceUVSet) {
+    m_faceItems.resize(m_mark.items);
+    m_faceItemCounts.resize(m_mark.itemCounts);
+    base::append(m_faceItemCounts, std::uint16_t{0});
+  }
+  for (std::size_t k = m_elementCustomLists; k < m_customLists.size(); ++k) {
+    CustomList& list = m_customLists[k];
+    list.counts->resize(list.countsMark);
+    list.items.resize(list.itemsMark);
+    base::append(*list.counts, 0u);
+  }
+  // A vertex keeps its place even when its line ended before any of its values.
+  if (!m_primitive) {
+    for (const Target& target : m_targets) {
+      if (target.size() <= index) target.resize(std::size_t(index) + 1);
+    }
+  }
+  base::append(m_dropped, index);
 }
 
 void PLYImporter::storeValue(const Route& route, const Property& property, const ValueArray& values) {

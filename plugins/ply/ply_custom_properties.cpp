@@ -112,14 +112,7 @@ void PLYImporter::prepareCustomProperties(const Element& element) {
           m_currentMesh->attribute<base::vector<Native>>(base::intern(name + ".items"), base::vector<Native>());
       m_routes[p] =
           Route{Route::Kind::customList, Conversion::native, static_cast<std::uint32_t>(m_customLists.size()), 0};
-      m_customLists.push_back({&counts, [&items](const ValueArray& values, DataType type) {
-                                 base::reserveForAppend(items, values.size());
-                                 for (const Value& value : values) {
-                                   Native native{};
-                                   storeNative(value, type, &native);
-                                   base::append(items, native);
-                                 }
-                               }});
+      m_customLists.push_back({&counts, listTarget(items)});
       if (faces) {
         m_faceReorders.push_back(
             {primitive, [&counts, &items](const auto& order) { reorderLists(counts, items, order); }});
@@ -132,7 +125,12 @@ void PLYImporter::prepareCustomProperties(const Element& element) {
 void PLYImporter::storeCustomList(const Route& route, const Property& property, const ValueArray& values) {
   CustomList& list = m_customLists[route.target];
   base::append(*list.counts, static_cast<std::uint32_t>(values.size()));
-  list.append(values, property.type);
+  const std::size_t start = list.items.size();
+  std::byte* at = list.items.resize(start + values.size()) + start * list.items.stride;
+  for (const Value& value : values) {
+    storeNative(value, property.type, at);
+    at += list.items.stride;
+  }
 }
 
 void PLYImporter::encodeWithFaceOrder() {

@@ -33,6 +33,51 @@ bool isTexcoordList(const Property& property) {
   return property.isList && property.semantic == PropertySemantic::unknown && property.name == "texcoord";
 }
 
+// The instance of face f: sources[f], or f itself when there are no sources.
+std::uint32_t sourceOf(const base::vector<std::uint32_t>& sources, std::size_t f) {
+  return sources.empty() ? static_cast<std::uint32_t>(f) : sources[f];
+}
+
+// Record f of `target` becomes the record of face f's instance; `faces` records remain.
+void gatherRecords(const ListTarget& target, const base::vector<std::uint32_t>& sources, std::size_t faces) {
+  if (sources.empty()) {
+    target.resize(faces);
+    return;
+  }
+  const std::size_t stride = target.stride;
+  const std::size_t have = target.size();
+  const std::byte* from = target.resize(have);
+  base::vector<std::byte> gathered(faces * stride);
+  for (std::size_t f = 0; f < faces; ++f) {
+    if (sources[f] < have) std::memcpy(gathered.data() + f * stride, from + sources[f] * stride, stride);
+  }
+  if (faces > 0) std::memcpy(target.resize(faces), gathered.data(), gathered.size());
+}
+
+// The same for lists: `counts` has an entry per instance and `items` every list's items.
+void gatherLists(base::vector<std::uint32_t>& counts, const ListTarget& items,
+                 const base::vector<std::uint32_t>& sources, std::size_t faces) {
+  base::vector<std::uint64_t> starts(counts.size() + 1, 0);
+  for (std::size_t k = 0; k < counts.size(); ++k) starts[k + 1] = starts[k] + counts[k];
+  const std::size_t stride = items.stride;
+  const std::byte* from = items.resize(items.size());
+  base::vector<std::uint32_t> gatheredCounts;
+  base::vector<std::byte> gatheredItems;
+  gatheredCounts.reserve(faces);
+  for (std::size_t f = 0; f < faces; ++f) {
+    const std::uint32_t instance = sourceOf(sources, f);
+    if (instance >= counts.size()) {
+      gatheredCounts.push_back(0);
+      continue;
+    }
+    gatheredCounts.push_back(counts[instance]);
+    gatheredItems.insert(gatheredItems.end(), from + starts[instance] * stride, from + starts[instance + 1] * stride);
+  }
+  counts.swap(gatheredCounts);
+  std::byte* to = items.resize(gatheredItems.size() / stride);
+  if (!gatheredItems.empty()) std::memcpy(to, gatheredItems.data(), gatheredItems.size());
+}
+
 template <class T>
 base::vector<T>& newFaceColours(base::AttribMap& set, std::uint32_t count) {
   base::vector<T>& list = set.attribute<base::vector<T>>(
@@ -87,18 +132,41 @@ void PLYImporter::storeFaceItems(const Property& property, const ValueArray& val
   base::append(m_faceItemCounts, static_cast<std::uint16_t>(count));
 }
 
-void PLYImporter::finishFaceData() {
-  if (!m_vcountsList || (!m_faceColourSet && !m_faceUVSet)) return;
+base::vector<std::uint32_t> PLYImporter::faceSources() const {
+  base::vector<std::uint32_t> sources;
+  if (m_dropped.empty() && m_listsPerInstance == 1) return sources;
+  const std::size_t faces = m_vcountsList->size();
+  sources.reserve(faces);
+  auto dropped = m_dropped.begin();
+  for (std::uint32_t instance = 0; instance < m_element->count && sources.size() < faces; ++instance) {
+    if (dropped != m_dropped.end() && *dropped == instance) {
+      ++dropped;
+      continue;
+    }
+    for (std::uint32_t k = 0; k < m_listsPerInstance && sources.size() < faces; ++k) sources.push_back(instance);
+  }
+  sources.resize(faces, m_element->count);  // faces of no instance take none of their values
+  return sources;
+}
+
+void PLYImporter::spreadOverFaces() {
+  const base::vector<std::uint32_t> sources = faceSources();
+  const std::size_t faces = m_vcountsList->size();
+  for (const Target& target : m_targets) gatherRecords(target, sources, faces);
+  for (std::size_t k = m_elementCustomLists; k < m_customLists.size(); ++k) {
+    gatherLists(*m_customLists[k].counts, m_customLists[k].items, sources, faces);
+  }
+  finishFaceData(sources);
+}
+
+void PLYImporter::finishFaceData(const base::vector<std::uint32_t>& sources) {
+  if (!m_faceColourSet && !m_faceUVSet) return;
   const std::uint32_t start = m_primitiveStart;
   const auto corners = static_cast<std::uint32_t>(m_indicesList->size()) - start;
   if (m_faceColourSet) {
-    // One colour per face read: the corners of face f point at colour f.
+    // One colour per face read (spread over the faces already): the corners of face f point
+    // at colour f.
     const auto faces = static_cast<std::uint32_t>(m_vcountsList->size());
-    if (m_faceColourSet->findMember(meshColorSet_schema::RGBA())) {
-      m_faceColourSet->attribute<base::vector<base::base_vec4<float>>>(meshColorSet_schema::RGBA()).resize(faces);
-    } else {
-      m_faceColourSet->attribute<base::vector<base::base_vec3<float>>>(meshColorSet_schema::RGB()).resize(faces);
-    }
     base::vector<std::uint32_t>& channel = newFaceChannel(*m_faceColourSet, start, corners);
     const std::size_t end = std::size_t(start) + corners;
     for (std::uint32_t f = 0; f < faces && channel.size() < end; ++f) {
@@ -106,19 +174,21 @@ void PLYImporter::finishFaceData() {
     }
     channel.resize(end, invalidIndex);
   }
-  if (m_faceUVSet) finishFaceUVs(start, corners);
+  if (m_faceUVSet) finishFaceUVs(start, corners, sources);
   m_faceColourSet = nullptr;
   m_faceUVSet = nullptr;
 }
 
-void PLYImporter::finishFaceUVs(std::uint32_t start, std::uint32_t corners) {
+void PLYImporter::finishFaceUVs(std::uint32_t start, std::uint32_t corners,
+                                const base::vector<std::uint32_t>& sources) {
   using UV = base::base_vec2<float>;
   base::vector<UV>& uvs = m_faceUVSet->attribute<base::vector<UV>>(meshUVSet_schema::UV(), base::vector<UV>());
   base::vector<std::uint32_t>& channel = newFaceChannel(*m_faceUVSet, start, corners);
   channel.resize(std::size_t(start) + corners);
   std::iota(channel.begin() + start, channel.end(), 0u);
   const base::vector<std::uint16_t>& faces = *m_vcountsList;
-  const bool matching = m_faceItemCounts.size() == faces.size() && m_faceItems.size() == 2 * std::size_t(corners) &&
+  const bool matching = sources.empty() && m_faceItemCounts.size() == faces.size() &&
+                        m_faceItems.size() == 2 * std::size_t(corners) &&
                         std::equal(faces.begin(), faces.end(), m_faceItemCounts.begin(),
                                    [](std::uint16_t n, std::uint16_t items) { return 2u * n == items; });
   uvs.resize(corners);
@@ -127,25 +197,36 @@ void PLYImporter::finishFaceUVs(std::uint32_t start, std::uint32_t corners) {
       std::memcpy(static_cast<void*>(uvs.data()), m_faceItems.data(), m_faceItems.size() * sizeof(std::uint32_t));
     }
   } else {
-    // Each face takes the pairs its list has for its corners; missing ones read (0, 0).
-    std::size_t item = 0, corner = 0, mismatched = 0;
-    for (std::size_t f = 0; f < faces.size(); ++f) {
-      const std::size_t items = f < m_faceItemCounts.size() ? m_faceItemCounts[f] : 0;
-      const std::size_t pairs =
-          std::min<std::size_t>({faces[f], items / 2, corners - std::min<std::size_t>(corner, corners)});
-      if (pairs > 0)
-        std::memcpy(static_cast<void*>(uvs.data() + corner), m_faceItems.data() + item, pairs * sizeof(UV));
-      if (items != 2u * faces[f]) ++mismatched;
-      item += items;
-      corner += faces[f];
-    }
-    base::log().message(base::logScene, base::logWarning,
-                        "{} faces have a texcoord list without two values per corner: corners without values read "
-                        "(0, 0), values beyond the corners are dropped",
-                        mismatched);
+    spreadFaceUVs(uvs, sources);
   }
   m_faceItems = {};
   m_faceItemCounts = {};
+}
+
+void PLYImporter::spreadFaceUVs(base::vector<base::base_vec2<float>>& uvs, const base::vector<std::uint32_t>& sources) {
+  // An instance's list covers the corners of every face it gave, in order; missing pairs
+  // read (0, 0). Lists come one per instance, an instance that was left out has an empty one.
+  using UV = base::base_vec2<float>;
+  const base::vector<std::uint16_t>& faces = *m_vcountsList;
+  std::size_t item = 0, corner = 0, mismatched = 0;
+  std::uint32_t listed = 0;  // instances whose lists lie before `item`
+  for (std::size_t f = 0; f < faces.size();) {
+    const std::uint32_t instance = sourceOf(sources, f);
+    std::size_t instanceCorners = 0;
+    const std::size_t first = corner;
+    for (; f < faces.size() && sourceOf(sources, f) == instance; ++f) instanceCorners += faces[f];
+    for (; listed < instance && listed < m_faceItemCounts.size(); ++listed) item += m_faceItemCounts[listed];
+    const std::size_t items = instance < m_faceItemCounts.size() ? m_faceItemCounts[instance] : 0;
+    const std::size_t pairs = std::min({instanceCorners, items / 2, uvs.size() - std::min(first, uvs.size())});
+    if (pairs > 0) std::memcpy(static_cast<void*>(uvs.data() + first), m_faceItems.data() + item, pairs * sizeof(UV));
+    if (items != 2 * instanceCorners) ++mismatched;
+    corner = first + instanceCorners;
+  }
+  if (mismatched == 0) return;
+  base::log().message(base::logScene, base::logWarning,
+                      "Element '{}': {} faces have a texcoord list without two values per corner: corners without "
+                      "values read (0, 0), values beyond the corners are dropped",
+                      base::clipped(displayName(*m_element)), mismatched);
 }
 
 base::vector<std::uint32_t>& PLYImporter::newFaceChannel(base::AttribMap& set, std::uint32_t start,

@@ -16,6 +16,25 @@
 
 namespace ply {
 
+/// A list of the mesh (or of the importer's material lists) that values go into, whatever
+/// its type: its records can be counted and resized, growing by the project's growth rule.
+struct ListTarget {
+  std::function<std::byte*(std::size_t)> resize;  ///< to this many records; gives the first
+  std::function<std::size_t()> size;
+  std::uint32_t stride = 0;  ///< bytes of a record
+};
+
+/// The target over `list`, which must outlive it.
+template <class T>
+ListTarget listTarget(base::vector<T>& list) {
+  return {[&list](std::size_t records) {
+            if (records > list.size()) base::reserveForAppend(list, records - list.size());
+            list.resize(records);
+            return reinterpret_cast<std::byte*>(list.data());
+          },
+          [&list] { return list.size(); }, sizeof(T)};
+}
+
 /// The semantic the importer reads a property as: its own, or for names that other tools
 /// give texture coordinates (texture_u/texture_v, texture_s/texture_t) u and v. The header
 /// keeps them as unknown names: only the import reads them as coordinates.
@@ -46,16 +65,18 @@ class PLYImporter final : public scene::SceneImportPlugin {
   // The reader's receiver (ply_parser.h).
   bool plyElement(const Element& element);
   bool plyPlan(const Element& element, ElementPlan& plan);
-  void beginInstance(std::uint32_t index) { m_instanceIndex = index; }
+  void beginInstance(std::uint32_t index) {
+    m_instanceIndex = index;
+    if (m_marksInstances) markInstance();
+  }
+  /// Undoes what instance `index` appended. A face, strip or edge instance is left out with
+  /// all its values; any other instance keeps its place (as far as it was read, zero beyond),
+  /// so that later faces still name the right vertices.
+  void dropInstance(std::uint32_t index);
   void plyProperty(const Element& element, const Property& property, const ValueArray& values);
 
  private:
-  /// A list of the mesh (or of the importer's material lists) that values go into.
-  struct Target {
-    std::function<std::byte*(std::size_t)> resize;
-    std::function<std::size_t()> size;
-    std::uint32_t stride = 0;
-  };
+  using Target = ListTarget;
   static constexpr std::uint32_t noTarget = 0xFFFFFFFFu;
   /// Where one property of the current element goes.
   struct Route {
@@ -73,6 +94,14 @@ class PLYImporter final : public scene::SceneImportPlugin {
   };
 
   void finishElement();
+  void markInstance();
+  /// Each face of the current face element takes the per-instance values (colours, kept
+  /// properties) of the instance it came from: one face per index list of each instance that
+  /// was read whole.
+  void spreadOverFaces();
+  /// The instance each face of the current face element came from; empty when face f came
+  /// from instance f.
+  base::vector<std::uint32_t> faceSources() const;
   /// The entries to make for an element's lists before its data arrives: its count when the
   /// stream's size bounds the counts, none otherwise (the lists then grow as data arrives).
   std::uint32_t initialCount(const Element& element) const { return m_sized ? element.count : 0; }
@@ -97,8 +126,9 @@ class PLYImporter final : public scene::SceneImportPlugin {
   // as face-varying sets, whose index channels the delta encoding moves with the faces.
   void prepareFaceData(const Element& element);
   void storeFaceItems(const Property& property, const ValueArray& values);
-  void finishFaceData();
-  void finishFaceUVs(std::uint32_t start, std::uint32_t corners);
+  void finishFaceData(const base::vector<std::uint32_t>& sources);
+  void finishFaceUVs(std::uint32_t start, std::uint32_t corners, const base::vector<std::uint32_t>& sources);
+  void spreadFaceUVs(base::vector<base::base_vec2<float>>& uvs, const base::vector<std::uint32_t>& sources);
   base::vector<std::uint32_t>& newFaceChannel(base::AttribMap& set, std::uint32_t start, std::uint32_t corners);
   void padFaceChannels();
 
@@ -165,6 +195,20 @@ class PLYImporter final : public scene::SceneImportPlugin {
   std::uint32_t m_instanceIndex = 0;
   base::vector<std::uint32_t> m_scratch;
   BadIndexReport m_badIndices;
+  /// Index lists per instance of the current face element: each gives one face.
+  std::uint32_t m_listsPerInstance = 0;
+  /// Instances of the current element that could not be read whole, in order.
+  base::vector<std::uint32_t> m_dropped;
+  /// Whether instances of the current element append to lists, which a drop must undo.
+  bool m_marksInstances = false;
+  /// The lengths of the current element's growing lists when its current instance began.
+  struct InstanceMark {
+    std::size_t indices = 0;
+    std::size_t faceCounts = 0;
+    std::size_t runCounts = 0;
+    std::size_t items = 0;
+    std::size_t itemCounts = 0;
+  } m_mark;
 
   // The face element's texture coordinates as read (float bits, and the count of each
   // face's list), until its element ends and they become a face-varying UV set.
@@ -177,12 +221,17 @@ class PLYImporter final : public scene::SceneImportPlugin {
   /// Face-varying index channels, padded to the whole index list when the mesh is done.
   base::vector<base::vector<std::uint32_t>*> m_faceChannels;
 
-  /// A kept custom list property: its counts and the type-erased append of its items.
+  /// A kept custom list property: the length of each instance's list and every list's items
+  /// in the property's own type, with their lengths when the current instance began.
   struct CustomList {
     base::vector<std::uint32_t>* counts;
-    std::function<void(const ValueArray&, DataType)> append;
+    Target items;
+    std::size_t countsMark = 0;
+    std::size_t itemsMark = 0;
   };
   base::vector<CustomList> m_customLists;
+  /// The first of m_customLists that the current element made.
+  std::size_t m_elementCustomLists = 0;
   /// Per-face custom data of the face primitive `primitive`, put in the faces' new order
   /// (order[k] is the index the face at k had in the file).
   struct FaceReorder {
@@ -194,11 +243,7 @@ class PLYImporter final : public scene::SceneImportPlugin {
 
 template <class T>
 std::uint32_t PLYImporter::addTarget(base::vector<T>& list) {
-  m_targets.push_back({[&list](std::size_t records) {
-                         list.resize(records);
-                         return reinterpret_cast<std::byte*>(list.data());
-                       },
-                       [&list] { return list.size(); }, sizeof(T)});
+  m_targets.push_back(listTarget(list));
   return static_cast<std::uint32_t>(m_targets.size() - 1);
 }
 

@@ -21,6 +21,14 @@ namespace ply {
 /// ply_plan.h); the reader then moves whole columns into place and calls plyProperty only
 /// for the properties the plan leaves to it. False, or a plan that does not cover every
 /// property, keeps the per-property calls.
+///
+/// A receiver may also have `void dropInstance(std::uint32_t)`. It then gets
+/// `beginInstance(i)` before every instance that is read one by one (not only delivered
+/// ones), and `dropInstance(i)` after such an instance that could not be read whole: an
+/// ASCII line that does not parse (the reader skips the line and goes on) or data that ends
+/// inside it. Whatever of instance i reached the receiver before, through plyProperty or
+/// the plan's arrays and sinks, is the receiver's to undo or keep. Instances read in bulk
+/// are always whole.
 template <class R>
 concept Receiver = requires(R& receiver, const Element& element, const Property& property, const ValueArray& values,
                             std::uint32_t index) {

@@ -122,7 +122,48 @@ TEST(PlyAscii, AByteThatStartsNoValueSkipsTheRestOfItsLine) {
   EXPECT_EQ(r.result, ply::ReadResult::complete);
   // The broken instance delivered its first value; the next instance starts on the next line.
   EXPECT_EQ(r.recorder.instances, (std::vector<std::string>{"1 2", "3", "5 6"}));
-  EXPECT_EQ(r.log, (std::vector<std::string>{"Unable to parse property instance. Skipping this element instance"}));
+  EXPECT_EQ(r.log, (std::vector<std::string>{
+                       "Unable to parse property instance. Skipping this element instance",
+                       "Element 'vertex': 1 of 3 instances could not be parsed; their lines were skipped"}));
+}
+
+// A recorder that also hears of the instances that could not be read whole.
+struct DroppingRecorder : PlyRecorder {
+  void dropInstance(std::uint32_t index) {
+    EXPECT_EQ(index + 1, expectedIndex) << "only the instance begun last is dropped";
+    instances.back() = "dropped " + instances.back();
+  }
+};
+
+TEST(PlyBody, InstancesNotReadWholeAreDroppedWithTheReceiverThatAsks) {
+  const std::string ascii =
+      asciiFile("property int x\nproperty list uchar int i\n", 5, "1 2 0 1\n2 2 0 # 1\n3 1 5\n4 x\n5 3 0 1");
+  const std::string binary =
+      "ply\nformat binary_little_endian 1.0\nelement vertex 2\nproperty uchar x\nproperty "
+      "list uchar uchar i\nend_header\n\x01\x01\x07\x02\x03\x01"s;
+  const std::pair<std::string, std::vector<std::string>> cases[] = {
+      // A malformed line drops its instance and the next one starts on the next line; a
+      // letter word reads 0 and breaks nothing; the end of the data drops the instance it cuts.
+      {ascii, {"1 {0 1}", "dropped 2", "3 {5}", "4 {}", "dropped 5"}},
+      {binary, {"1 {7}", "dropped 2"}}};
+  for (const auto& [file, expected] : cases) {
+    for (const Source source : allSources) {
+      DroppingRecorder recorder;
+      ply::Header header;
+      LogCapture quiet;
+      base::Stream stream = testing_support::sourceStream(file, source);
+      ply::readFile(header, stream, recorder);
+      EXPECT_EQ(recorder.instances, expected) << sourceName(source);
+    }
+  }
+}
+
+TEST(PlyAscii, ManySkippedLinesAreCountedNotListed) {
+  std::string body;
+  for (int k = 0; k < 25; ++k) body += "1 # 2\n";
+  const Read r = read(asciiFile("property int x\nproperty int y\n", 25, body));
+  EXPECT_EQ(r.log.size(), ply::detail::SkippedLineReport::linesPerElement + 1);
+  EXPECT_EQ(r.log.back(), "Element 'vertex': 25 of 25 instances could not be parsed; their lines were skipped");
 }
 
 TEST(PlyAscii, BodyEndingEarlyDeliversNothingPastTheEnd) {

@@ -117,7 +117,11 @@ void expectCornersKeepTheirData(base::AttribMap& mesh, const std::vector<Face>& 
                                            scene::meshPrimitive_schema::vcounts());
   std::size_t offset = 0;
   for (const std::uint16_t n : counts) {
-    const Face& face = *byVertices.at({indices.begin() + offset, indices.begin() + offset + n});
+    const auto found = byVertices.find({indices.begin() + offset, indices.begin() + offset + n});
+    ASSERT_NE(found, byVertices.end()) << "a face the file does not have: "
+                                       << fmt::format("{}", fmt::join(indices.begin() + offset,
+                                                                      indices.begin() + offset + n, " "));
+    const Face& face = *found->second;
     for (std::size_t c = offset; c < offset + n; ++c) {
       const std::size_t k = std::find(face.corners.begin(), face.corners.end(), indices[c]) - face.corners.begin();
       const UV uv = uvs.at(uvChannel[c]);
@@ -167,7 +171,89 @@ TEST(FaceData, ListsWithoutTwoValuesPerCornerFillWhatTheyHave) {
   for (std::uint32_t c : channel) corners.push_back(uvs.at(c));
   EXPECT_EQ(corners, (std::vector<UV>{{1, 2}, {3, 4}, {0, 0}, {0, 0}, {0, 0}, {0, 0}, {5, 6}, {7, 8}, {9, 10}}));
   ASSERT_EQ(log.entries.size(), 2u);  // the unknown name, then the faces that did not match
-  EXPECT_EQ(log.entries[1].text.rfind("3 faces have a texcoord list without two values per corner", 0), 0u);
+  EXPECT_EQ(log.entries[1].text.rfind("Element 'face': 3 faces have a texcoord list without two values", 0), 0u);
+}
+
+// Face f's line made unreadable: a byte that starts no value after its first word.
+std::string breakFaceLine(std::string file, std::size_t f) {
+  std::size_t at = file.find("end_header\n");
+  for (std::size_t line = 0; line <= 60 + f; ++line) at = file.find('\n', at + 1);
+  file.insert(file.find(' ', at + 1), " #");
+  return file;
+}
+
+TEST(FaceData, AFaceThatCannotBeReadLeavesWithAllItsValues) {
+  const std::vector<Face> faces = testFaces();
+  std::vector<Face> kept;
+  std::string ascii = asciiFile(faces);
+  for (std::size_t f = 0; f < faces.size(); ++f) {
+    if (f % 13 == 3 || f + 1 == faces.size()) {
+      ascii = breakFaceLine(ascii, f);
+    } else {
+      kept.push_back(faces[f]);
+    }
+  }
+  // The data ends inside the last face, after its corners and before its coordinates.
+  std::string binary = binaryFile(faces);
+  binary.resize(binary.size() - 2 - 8 * faces.back().uvs.size() - 2);
+  for (const bool plans : {true, false}) {
+    for (const bool isBinary : {true, false}) {
+      SCOPED_TRACE(std::string(isBinary ? "binary" : "ascii") + (plans ? ", plans" : ", per property"));
+      LogCapture log(base::logWarning);
+      ImportedScene imported = importText(isBinary ? binary : ascii, plans);
+      ASSERT_TRUE(imported.loaded);
+      expectCornersKeepTheirData(imported.mesh(), isBinary ? std::vector<Face>(faces.begin(), faces.end() - 1) : kept,
+                                 !isBinary);
+    }
+  }
+}
+
+TEST(FaceData, EveryFaceOfAnInstanceTakesItsValuesAndKeptProperties) {
+  // Two index lists per instance: each gives a face, and both faces carry the instance's
+  // colour and kept values. The middle instance cannot be read.
+  const std::string file = asciiHeader +
+                           "element vertex 4\nproperty float x\nelement face 3\nproperty uchar red\nproperty uchar "
+                           "green\nproperty uchar blue\nproperty list uchar int vertex_indices\nproperty list uchar "
+                           "int vertex_index\nproperty float quality\nproperty list uchar ushort tags\nend_header\n"
+                           "0\n1\n2\n3\n"
+                           "51 0 0 3 0 1 2 3 1 2 3 1.5 2 7 8\n"
+                           "102 0 0 3 0 # 3 3 0 1 3 2.5 1 9\n"
+                           "153 0 0 3 0 2 3 3 0 1 3 3.5 0\n";
+  // Each face by its vertices: red, quality, tags.
+  struct Expected {
+    float red;
+    float quality;
+    std::vector<std::uint16_t> tags;
+  };
+  const std::map<std::set<std::uint32_t>, Expected> expected = {{{0, 1, 2}, {0.2f, 1.5f, {7, 8}}},
+                                                                {{1, 2, 3}, {0.2f, 1.5f, {7, 8}}},
+                                                                {{0, 2, 3}, {0.6f, 3.5f, {}}},
+                                                                {{0, 1, 3}, {0.6f, 3.5f, {}}}};
+  for (const bool plans : {true, false}) {
+    SCOPED_TRACE(plans ? "plans" : "per property");
+    LogCapture quiet;
+    ImportedScene imported = importText(file, plans, {{"importCustomProperties", true}});
+    base::AttribMap& mesh = imported.mesh();
+    ASSERT_TRUE(scene::decodeIndexDeltas(mesh));
+    const auto& indices = list<std::uint32_t>(mesh, mesh_schema::indices());
+    const auto& colours =
+        setList<base::base_vec3<float>>(mesh, mesh_schema::colorSets(), 0, meshColorSet_schema::RGB());
+    const auto& channel = setList<std::uint32_t>(mesh, mesh_schema::colorSets(), 0, meshColorSet_schema::indices());
+    const auto& quality = list<float>(mesh, base::intern("ply:quality"));
+    const auto& tagCounts = list<std::uint32_t>(mesh, base::intern("ply:tags.counts"));
+    const auto& tagItems = list<std::uint16_t>(mesh, base::intern("ply:tags.items"));
+    ASSERT_EQ(indices.size(), 12u);
+    ASSERT_EQ(quality.size(), 4u);
+    ASSERT_EQ(tagCounts.size(), 4u);
+    std::size_t tag = 0;
+    for (std::size_t f = 0; f < 4; ++f) {
+      const Expected& face = expected.at({indices.begin() + 3 * f, indices.begin() + 3 * f + 3});
+      for (std::size_t c = 3 * f; c < 3 * f + 3; ++c) EXPECT_NEAR(colours.at(channel.at(c)).x, face.red, 1e-6);
+      EXPECT_EQ(quality[f], face.quality);
+      EXPECT_EQ(std::vector<std::uint16_t>(tagItems.begin() + tag, tagItems.begin() + tag + tagCounts[f]), face.tags);
+      tag += tagCounts[f];
+    }
+  }
 }
 
 TEST(FaceData, CornersOfOtherPrimitivesHoldTheInvalidIndex) {
