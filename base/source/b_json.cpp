@@ -1,6 +1,7 @@
 #include "b_json.h"
 
 #include "b_exception.h"
+#include "b_utf8.h"
 
 #include <fmt/format.h>
 #include <rapidjson/document.h>
@@ -47,8 +48,11 @@ JsonWriter::~JsonWriter() = default;
 
 std::string_view JsonWriter::text() const { return {m_impl->buffer.GetString(), m_impl->buffer.GetSize()}; }
 void JsonWriter::beginObject() { m_impl->writer.StartObject(); }
+// Keys and strings come from files too (names as written): what is not UTF-8 is shown as
+// U+FFFD, so that the output is always valid JSON.
 void JsonWriter::key(std::string_view name) {
-  m_impl->writer.Key(name.data(), static_cast<rapidjson::SizeType>(name.size()), true);
+  const std::string text = utf8Text(name);
+  m_impl->writer.Key(text.data(), static_cast<rapidjson::SizeType>(text.size()), true);
 }
 void JsonWriter::endObject() { m_impl->writer.EndObject(); }
 void JsonWriter::beginArray() { m_impl->writer.StartArray(); }
@@ -59,7 +63,8 @@ void JsonWriter::value(std::int64_t value) { m_impl->writer.Int64(value); }
 void JsonWriter::value(std::uint64_t value) { m_impl->writer.Uint64(value); }
 void JsonWriter::value(float value) { m_impl->real(value); }
 void JsonWriter::value(double value) { m_impl->real(value); }
-void JsonWriter::value(std::string_view text) {
+void JsonWriter::value(std::string_view bytes) {
+  const std::string text = utf8Text(bytes);
   m_impl->writer.String(text.data(), static_cast<rapidjson::SizeType>(text.size()), true);
 }
 

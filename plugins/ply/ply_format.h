@@ -58,7 +58,8 @@ struct Property {
   DataType type = DataType::none;  ///< the value's type, or each list item's
   PropertySemantic semantic = PropertySemantic::unknown;
   base::string name;  ///< kept only when the semantic is unknown
-  base::string word;  ///< the name as the header spells it, whatever the semantic ("s", "tx")
+  base::string word;  ///< the name as the header spells it, whatever the semantic ("s", "tx"): every
+                      ///< byte up to the next blank, tab or line end
   bool isList = false;
   DataType countType = DataType::none;  ///< the list count's type; only for lists
 };
@@ -68,6 +69,7 @@ struct Element {
   base::vector<Property> properties;
   ElementSemantic semantic = ElementSemantic::unknown;
   base::string name;  ///< kept only when the semantic is unknown
+  base::string word;  ///< the name as the header spells it, whatever the semantic
   std::uint32_t count = 0;
 };
 

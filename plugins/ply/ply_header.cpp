@@ -51,12 +51,11 @@ class HeaderWords {
   }
 
   /// The next word of the current line; nothing when the line or the data ends first.
-  std::optional<std::string_view> argument() {
-    for (int c = m_window.peek(); c == ' ' || c == '\t'; c = m_window.peek()) m_window.advance(1);
-    const int c = m_window.peek();
-    if (c < 0 || c == '\n' || c == '\r') return std::nullopt;
-    return m_words.read(m_window);
-  }
+  std::optional<std::string_view> argument() { return onThisLine(wordBytes); }
+
+  /// The next name of the current line: every byte up to the next blank, tab or line end;
+  /// nothing when the line or the data ends first.
+  std::optional<std::string_view> name() { return onThisLine(nameBytes); }
 
   /// Consumes the rest of the line: up to and including the first NUL, LF or CR, then any
   /// further CR, LF and NUL bytes.
@@ -73,6 +72,13 @@ class HeaderWords {
   unsigned line() const { return m_line; }
 
  private:
+  std::optional<std::string_view> onThisLine(const std::array<bool, 256>& bytes) {
+    for (int c = m_window.peek(); c == ' ' || c == '\t'; c = m_window.peek()) m_window.advance(1);
+    const int c = m_window.peek();
+    if (c < 0 || c == '\n' || c == '\r') return std::nullopt;
+    return m_words.read(m_window, bytes);
+  }
+
   ByteWindow& m_window;
   WordReader m_words;
   unsigned m_line = 1;
@@ -105,9 +111,10 @@ bool parseFormatLine(Header& header, HeaderWords& words, base::Stream& stream) {
 
 bool parseElement(Header& header, HeaderWords& words) {
   Element element;
-  const std::optional<std::string_view> name = words.argument();
+  const std::optional<std::string_view> name = words.name();
   if (!name) return lineEnded(words, "the element's name");
   element.semantic = elementSemanticFromName(*name);
+  element.word = *name;
   if (element.semantic == ElementSemantic::unknown) element.name = *name;
   const std::optional<std::string_view> count = words.argument();
   if (!count) return lineEnded(words, fmt::format("the count of element '{}'", base::clipped(displayName(element))));
@@ -155,7 +162,7 @@ bool parseProperty(Header& header, HeaderWords& words) {
   }
   property.type = dataTypeFromWord(*word);
   if (property.type == DataType::none) return false;
-  const std::optional<std::string_view> name = words.argument();
+  const std::optional<std::string_view> name = words.name();
   if (!name) return lineEnded(words, "the property's name");
   property.semantic = propertySemanticFromName(*name);
   property.word = *name;

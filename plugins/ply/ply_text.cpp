@@ -155,20 +155,20 @@ void skipLine(ByteWindow& window) {
   for (int c = window.peek(); c == '\n' || c == '\r' || c == 0; c = window.peek()) window.advance(1);
 }
 
-std::string_view WordReader::read(ByteWindow& window) {
+std::string_view WordReader::read(ByteWindow& window, const std::array<bool, 256>& bytes) {
   skipBlanks(window);
   // Most words lie whole inside the window: hand them out in place.
   const std::uint8_t* begin = window.cursor();
   const std::uint8_t* end = window.end();
   const std::uint8_t* stop = begin;
-  while (stop != end && wordBytes[*stop]) ++stop;
+  while (stop != end && bytes[*stop]) ++stop;
   if (stop != end) {
     window.advance(static_cast<std::size_t>(stop - begin));
     return {reinterpret_cast<const char*>(begin), static_cast<std::size_t>(stop - begin)};
   }
   // The word may go on past the window: copy it out while refilling.
   m_copy.clear();
-  for (int c = window.peek(); c >= 0 && wordBytes[static_cast<std::size_t>(c)]; c = window.peek()) {
+  for (int c = window.peek(); c >= 0 && bytes[static_cast<std::size_t>(c)]; c = window.peek()) {
     m_copy.push_back(static_cast<char>(c));
     window.advance(1);
   }

@@ -20,6 +20,15 @@ inline constexpr std::array<bool, 256> wordBytes = [] {
   return table;
 }();
 
+/// Bytes that make up element and property names in a header: every byte but the blank,
+/// the tab, the line ends and NUL, so that a name in any language and any encoding is kept.
+inline constexpr std::array<bool, 256> nameBytes = [] {
+  std::array<bool, 256> table{};
+  table.fill(true);
+  for (char c : std::string_view(" \t\r\n\0", 5)) table[static_cast<unsigned char>(c)] = false;
+  return table;
+}();
+
 /// Space, tab, CR and LF.
 inline bool isBlank(int c) { return c == ' ' || c == '\t' || c == '\r' || c == '\n'; }
 
@@ -33,9 +42,10 @@ void skipLine(ByteWindow& window);
 /// Reads words. A word's text stays valid until the next call.
 class WordReader {
  public:
-  /// Skips blanks, then takes word bytes. Empty when the next byte is no word byte or the
-  /// data ends. A word is always returned whole, wherever it lies in the data.
-  std::string_view read(ByteWindow& window);
+  /// Skips blanks, then takes the bytes that `bytes` marks (word bytes unless told
+  /// otherwise). Empty when the next byte is no such byte or the data ends. A word is always
+  /// returned whole, wherever it lies in the data.
+  std::string_view read(ByteWindow& window, const std::array<bool, 256>& bytes = wordBytes);
 
  private:
   base::string m_copy;

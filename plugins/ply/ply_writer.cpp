@@ -1,5 +1,7 @@
 #include "ply_writer.h"
 
+#include "b_exception.h"
+#include "b_log.h"
 #include "ply_columns.h"
 
 #include <fmt/format.h>
@@ -268,13 +270,33 @@ void writeAscii(Output& output, const WriteElement& element) {
   }
 }
 
+// A name the reader would read back whole: not empty, and none of the bytes that end a name.
+void checkName(std::string_view name, std::string_view what) {
+  const char* why = name.empty() ? "is empty"
+                    : name.find_first_of(std::string_view(" \t\r\n\0", 5)) != std::string_view::npos
+                        ? "holds white space, a line break or NUL"
+                        : nullptr;
+  if (why) {
+    base::raise<base::exception>("ply::writePly",
+                                 fmt::format("the name of {} {}: a PLY header cannot hold it", what, why));
+  }
+}
+
 std::string headerText(Encoding encoding, const std::vector<WriteElement>& elements,
                        std::span<const std::string> comments) {
   std::string text = fmt::format("ply\nformat {} 1.0\n", encodingWord(encoding));
-  for (const std::string& comment : comments) text += fmt::format("comment {}\n", comment);
+  for (const std::string& comment : comments) {
+    if (comment.find_first_of("\r\n") != std::string::npos) {
+      base::raise<base::exception>("ply::writePly", "a comment holds a line break: a PLY header cannot hold it");
+    }
+    text += fmt::format("comment {}\n", comment);
+  }
   for (const WriteElement& element : elements) {
+    checkName(element.name, fmt::format("element '{}'", base::clipped(element.name)));
     text += fmt::format("element {} {}\n", element.name, element.count);
     for (const WriteProperty& property : element.properties) {
+      checkName(property.name, fmt::format("property '{}' of element '{}'", base::clipped(property.name),
+                                           base::clipped(element.name)));
       if (property.isList) {
         text += fmt::format("property list {} {} {}\n", dataTypeWord(property.countType), dataTypeWord(property.type),
                             property.name);

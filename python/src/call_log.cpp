@@ -1,5 +1,7 @@
 #include "call_log.h"
 
+#include "b_utf8.h"
+
 #include <fmt/format.h>
 
 #include <algorithm>
@@ -16,7 +18,8 @@ class ThreadLogSink : public base::LogSink {
   ~ThreadLogSink() override { base::log().removeSink(this); }
   void write(base::name_id, int level, std::string_view text) override {
     if (currentCall) {
-      currentCall->m_messages.push_back({level, std::string(text)});
+      // Messages quote names from files, which may be in any encoding; Python takes text.
+      currentCall->m_messages.push_back({level, base::utf8Text(text)});
     } else {
       fmt::print(stderr, "meshport: {}: {}\n", base::levelText(level), text);
     }

@@ -4,6 +4,7 @@
 #include "b_attrib_factory.h"
 #include "b_attribute_map.h"
 #include "b_structured.h"
+#include "b_utf8.h"
 
 #include <algorithm>
 #include <cmath>
@@ -20,7 +21,7 @@ namespace {
 class PythonValueWriter : public base::StructuredWriter {
  public:
   void beginObject() override { open(py::dict()); }
-  void key(std::string_view name) override { m_key = py::str(name.data(), name.size()); }
+  void key(std::string_view name) override { m_key = pythonText(name); }
   void endObject() override { close(); }
   void beginArray() override { open(py::list()); }
   void endArray() override { close(); }
@@ -30,7 +31,7 @@ class PythonValueWriter : public base::StructuredWriter {
   void value(std::uint64_t value) override { put(py::int_(value)); }
   void value(float value) override { put(py::float_(value)); }
   void value(double value) override { put(py::float_(value)); }
-  void value(std::string_view text) override { put(py::str(text.data(), text.size())); }
+  void value(std::string_view text) override { put(pythonText(text)); }
 
   py::object result() const { return m_result; }
 
@@ -115,12 +116,14 @@ std::optional<py::array> numberList(const base::Attribute& attribute, const List
 
 }  // namespace
 
+py::str pythonText(std::string_view bytes) { return py::str(base::utf8Text(bytes)); }
+
 py::object toPython(const base::Attribute& attribute, const ListArrayMaker& makeArray) {
   if (const base::AttribMap* map = attribute.asMap()) {
     std::map<std::string_view, const base::Attribute*> sorted;
     for (const auto& [name, member] : map->members()) sorted.emplace(base::text(name), member);
     py::dict members;
-    for (const auto& [name, member] : sorted) members[py::str(name.data(), name.size())] = toPython(*member, makeArray);
+    for (const auto& [name, member] : sorted) members[pythonText(name)] = toPython(*member, makeArray);
     return members;
   }
   if (const base::AttribArray* array = attribute.asArray()) {

@@ -6,6 +6,7 @@
 #include <pybind11/pybind11.h>
 
 #include <functional>
+#include <string_view>
 
 namespace pymeshport {
 
@@ -16,6 +17,10 @@ namespace py = pybind11;
 /// storage; another caller may copy.
 using ListArrayMaker = std::function<py::array(const base::Attribute& list, const void* data, std::size_t rows,
                                                std::size_t width, const py::dtype& dtype)>;
+
+/// Bytes from a file (names as written, texts) as a Python str: what is not UTF-8 becomes
+/// U+FFFD, as Python's "replace" error handler does.
+py::str pythonText(std::string_view bytes);
 
 /// The attribute as a Python value: a map as a dict by member name (sorted), a structure
 /// list as a list, a list of numbers or of vectors of numbers through `makeArray`, and any

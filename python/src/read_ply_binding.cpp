@@ -3,6 +3,7 @@
 #include "b_fs.h"
 #include "bindings.h"
 #include "python_bridge.h"
+#include "python_values.h"
 #include "raw_ply.h"
 
 #include <pybind11/stl/filesystem.h>
@@ -14,8 +15,8 @@ namespace {
 
 // `name`, or when the dict has it already, `name` with the first free number: ".2", ".3".
 py::str freeKey(const py::dict& dict, const std::string& name) {
-  py::str key(name);
-  for (int k = 2; dict.contains(key); ++k) key = py::str(name + "." + std::to_string(k));
+  py::str key = pythonText(name);
+  for (int k = 2; dict.contains(key); ++k) key = pythonText(name + "." + std::to_string(k));
   return key;
 }
 

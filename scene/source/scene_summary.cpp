@@ -2,6 +2,7 @@
 
 #include "b_box.h"
 #include "b_normal.h"
+#include "b_utf8.h"
 #include "b_vec.h"
 #include "scene_mesh.h"
 #include "scene_schema.h"
@@ -48,7 +49,7 @@ std::string keptProperties(const base::AttribMap& mesh) {
   std::vector<std::string> kept;
   for (const auto& [name, attribute] : mesh.members()) {
     if (base::text(name).starts_with("ply:")) {
-      kept.push_back(fmt::format("{} ({})", base::text(name), base::text(attribute->type())));
+      kept.push_back(fmt::format("{} ({})", base::utf8Text(base::text(name)), base::text(attribute->type())));
     }
   }
   std::sort(kept.begin(), kept.end());

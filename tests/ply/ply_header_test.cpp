@@ -124,6 +124,28 @@ TEST(PlyHeader, ElementsAndPropertiesWithTheirSemantics) {
                                                   "Found unknown property semantic in PLY file: w!"}));
 }
 
+TEST(PlyHeader, ANameIsEveryByteUpToTheNextBlankTabOrLineEnd) {
+  // Type words and counts keep the word rule; names take any byte, in any encoding.
+  const Parsed parsed = parse(
+      "ply\nformat ascii 1.0\nelement donn\xC3\xA9"
+      "es 1\nproperty float \xC3\xA9t\xC3\xA9\nproperty int a,b#c\t\n"
+      "property list uchar int \xFF\xFE\r\nelement vertex 0\nproperty float x\nend_header\n1 2 0\n");
+  ASSERT_TRUE(parsed.ok) << lastMessage(parsed);
+  const ply::Element& element = parsed.header.elements.at(0);
+  EXPECT_EQ(element.name,
+            "donn\xC3\xA9"
+            "es");
+  EXPECT_EQ(element.word,
+            "donn\xC3\xA9"
+            "es");
+  ASSERT_EQ(element.properties.size(), 3u);
+  EXPECT_EQ(element.properties[0].name, "\xC3\xA9t\xC3\xA9");
+  EXPECT_EQ(element.properties[1].name, "a,b#c");
+  EXPECT_EQ(element.properties[2].name, "\xFF\xFE");
+  EXPECT_EQ(parsed.header.elements.at(1).word, "vertex");
+  EXPECT_EQ(parsed.header.elements.at(1).properties.at(0).word, "x");
+}
+
 TEST(PlyHeader, KeywordsAreCaseSensitiveAndUnknownLinesAreSkipped) {
   const Parsed parsed =
       parse("ply\nformat ascii 1.0\nobj_info made here\nELEMENT vertex 1\ncomment quiet\nend_header\n");

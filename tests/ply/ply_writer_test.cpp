@@ -3,6 +3,8 @@
 // holds them.
 
 #include "ply_writer.h"
+#include "b_exception.h"
+#include "log_capture.h"
 #include "ply_recorder.h"
 
 #include <gtest/gtest.h>
@@ -15,6 +17,7 @@
 
 namespace {
 
+using namespace std::string_literals;
 using ply::DataType;
 using ply::Encoding;
 using testing_support::PlyRecorder;
@@ -134,6 +137,42 @@ TEST(PlyWriter, ListsOfOneLengthAndOfManyWithACountTypeThatHoldsThem) {
     EXPECT_EQ(recorder.instances[6].substr(0, 12), "{1 1.5 2 2.5");
     EXPECT_EQ(recorder.instances[7], "{151}");
   }
+}
+
+TEST(PlyWriter, NamesAReaderCannotReadBackAreRefused) {
+  const std::vector<float> values{1.0f};
+  for (const std::string& name : {""s, "two words"s, "tab\tbed"s, "line\nbreak"s, "nul\0byte"s}) {
+    for (const bool ofElement : {false, true}) {
+      std::vector<ply::WriteElement> elements{{"vertex", 1, {column("\xC3\xA9t\xC3\xA9", DataType::float32, values)}}};
+      (ofElement ? elements[0].name : elements[0].properties[0].name) = name;
+      base::vector<std::uint8_t> bytes;
+      base::Stream stream = base::vectorStream(bytes);
+      try {
+        ply::writePly(stream, Encoding::ascii, elements);
+        ADD_FAILURE() << "written: " << name;
+      } catch (const base::exception& error) {
+        EXPECT_NE(std::string(error.what()).find(ofElement ? "the name of element" : "the name of property"),
+                  std::string::npos)
+            << error.what();
+      }
+      EXPECT_TRUE(bytes.empty()) << "nothing is written before the header is known to be good";
+    }
+  }
+  // Any other byte is a name's, and reads back as written.
+  const std::vector<ply::WriteElement> elements{
+      {"donn\xC3\xA9"
+       "es",
+       1,
+       {column("\xFF,#", DataType::float32, values)}}};
+  const std::string file = written(elements, Encoding::binaryLittleEndian);
+  base::Stream in = base::memStream(file.data(), static_cast<std::int64_t>(file.size()));
+  ply::Header header;
+  testing_support::LogCapture quiet;
+  ASSERT_TRUE(ply::parseHeader(header, in));
+  EXPECT_EQ(header.elements.at(0).name,
+            "donn\xC3\xA9"
+            "es");
+  EXPECT_EQ(header.elements.at(0).properties.at(0).name, "\xFF,#");
 }
 
 }  // namespace

@@ -143,6 +143,17 @@ def test_names_stay_as_written_and_repeats_are_numbered(write_ply):
         "u": [1.0], "s": [2.0], "texture_u": [3.0], "s.2": [4.0]}
 
 
+def test_names_in_any_encoding_are_keys_with_what_is_not_utf8_replaced():
+    elements = meshport.read_ply(DATA / "ply" / "valid" / "ascii_names_not_ascii.ply")
+    assert list(elements) == ["donn\u00e9es", "vertex", "face"]
+    assert list(elements["vertex"])[-1] == "\u00e9t\u00e9"
+    assert list(elements["face"])[1:] == ["qualit\ufffd", "\ufffdtiquettes", "\ufffdtiquettes.counts"]
+    mesh = meshport.import_scene(DATA / "ply" / "valid" / "ascii_names_not_ascii.ply",
+                                 importCustomProperties=True).objects[0].attributes
+    assert mesh["ply:\u00e9t\u00e9"].tolist() == [0.5, 1.5, 2.5, 3.5]
+    assert "ply:qualit\ufffd" in mesh
+
+
 def test_compressed_files_read_like_plain_ones(tmp_path):
     plain = DATA / "ply" / "valid" / "binary_le_cube_triangles.ply"
     packed = tmp_path / "cube.ply.gz"

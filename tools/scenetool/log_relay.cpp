@@ -1,5 +1,7 @@
 #include "log_relay.h"
 
+#include "b_utf8.h"
+
 #include <fmt/format.h>
 
 namespace scenetool {
@@ -15,10 +17,12 @@ LogRelay::~LogRelay() {
   printHeld();
 }
 
-void LogRelay::write(base::name_id, int level, std::string_view text) {
+// Messages quote names from files, which may be in any encoding: the terminal gets text.
+void LogRelay::write(base::name_id, int level, std::string_view bytes) {
+  const std::string text = base::utf8Text(bytes);
   if (level == base::logError) {
     printHeld();
-    m_held = std::string(text);
+    m_held = text;
     return;
   }
   fmt::print(stderr, "{}: {}\n", base::levelText(level), text);

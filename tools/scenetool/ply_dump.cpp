@@ -1,5 +1,7 @@
 #include "ply_dump.h"
 
+#include "b_utf8.h"
+
 #include <fmt/format.h>
 
 #include <cmath>
@@ -72,7 +74,8 @@ bool PlyJsonDump::plyElement(const ply::Element& element) {
 void PlyJsonDump::writeElementHead(const ply::Element& element) {
   m_writer.StartObject();
   m_writer.Key("name");
-  m_writer.String(element.name.c_str(), static_cast<rapidjson::SizeType>(element.name.size()));
+  const std::string elementName = base::utf8Text(element.name);  // names from files may be in any encoding
+  m_writer.String(elementName.c_str(), static_cast<rapidjson::SizeType>(elementName.size()));
   m_writer.Key("semantic");
   m_writer.Uint(static_cast<unsigned>(element.semantic));
   m_writer.Key("count");
@@ -82,7 +85,8 @@ void PlyJsonDump::writeElementHead(const ply::Element& element) {
   for (const ply::Property& property : element.properties) {
     m_writer.StartObject();
     m_writer.Key("name");
-    m_writer.String(property.name.c_str(), static_cast<rapidjson::SizeType>(property.name.size()));
+    const std::string propertyName = base::utf8Text(property.name);
+    m_writer.String(propertyName.c_str(), static_cast<rapidjson::SizeType>(propertyName.size()));
     m_writer.Key("semantic");
     m_writer.Uint(static_cast<unsigned>(property.semantic));
     m_writer.Key("type");
