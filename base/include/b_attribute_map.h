@@ -100,6 +100,8 @@ class BASE1_API AttribMap : public Attribute {
   }
   /// The member `name` as stored here (no links followed, no base map asked), or null.
   const Attribute* findMember(name_id name) const { return member(name); }
+  /// Destroys member `name` (as stored here; a base map keeps its own); false when absent.
+  bool removeMember(name_id name);
   /// The slot that owns member `name`, or a shared slot holding null when absent. Neither
   /// links nor types are looked at. Throws on an empty name.
   Attribute** findAttributeMutable(name_id name);

@@ -256,6 +256,14 @@ void AttribMap::attribute(name_id name, Attribute* attr) {
   }
 }
 
+bool AttribMap::removeMember(name_id name) {
+  const auto at = lowerBound(name);
+  if (at == m_members.end() || at->first != name) return false;
+  delete at->second;
+  m_members.erase(at);
+  return true;
+}
+
 Attribute** AttribMap::findAttributeMutable(name_id name) {
   requireName(name, "base::AttribMap::findAttributeMutable");
   auto at = lowerBound(name);

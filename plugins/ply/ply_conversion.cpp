@@ -4,6 +4,7 @@
 
 #include "b_exception.h"
 #include "b_log.h"
+#include "ply_kept_properties.h"
 #include "ply_loader.h"
 #include "scene_mesh.h"
 #include "scene_schema.h"
@@ -168,7 +169,8 @@ bool PLYImporter::prepareVertices(const Element& element) {
     // say that the earlier ones are no longer there.
     if (m_positionsList) {
       base::log().message(base::logScene, base::logWarning,
-                          "Element 'vertex' appears again: its data replaces the earlier one's");
+                          "Element 'vertex' appears again: its vertices replace the earlier ones, with all their data");
+      dropVertexData();
     }
     positions = m_positionsList = &newMeshList<base::base_vec3<float>>(mesh, mesh_schema::positions(), count);
     wanted = true;
@@ -223,6 +225,23 @@ bool PLYImporter::prepareVertices(const Element& element) {
   return wanted || std::any_of(m_routes.begin(), m_routes.end(), [](const Route& route) {
            return route.kind == Route::Kind::customList || route.conversion == Conversion::native;
          });
+}
+
+void PLYImporter::dropVertexData() {
+  // Lists of the vertices that are no longer the mesh's cannot stay beside the new ones:
+  // nothing could tell which vertices they describe.
+  base::AttribMap& mesh = *m_currentMesh;
+  mesh.removeMember(mesh_schema::normals());
+  m_normalsList = nullptr;
+  for (const base::name_id sets : {mesh_schema::uvSets(), mesh_schema::colorSets()}) {
+    base::AttribArray& array = scene::arrayMember(mesh, sets);
+    for (std::uint32_t k = array.size(); k-- > 0;) {
+      const base::AttribMap* set = scene::mapAt(array, k);
+      // Face-varying sets (with their own index channel) belong to faces, which stay.
+      if (!set || !set->findMember(meshUVSet_schema::indices())) array.erase(static_cast<int>(k));
+    }
+  }
+  removeKeptVertexProperties(mesh);
 }
 
 void PLYImporter::routeVertexProperties(const Element& element, std::uint32_t positions, std::uint32_t normals,

@@ -6,6 +6,7 @@
 
 #include "b_log.h"
 #include "ply_columns.h"
+#include "ply_kept_properties.h"
 #include "ply_loader.h"
 #include "scene_index_delta.h"
 #include "scene_mesh.h"
@@ -99,6 +100,9 @@ void PLYImporter::prepareCustomProperties(const Element& element) {
     detail::forType<Conversion::native>(property.type, [&]<DataType T, Conversion>() {
       using Native = detail::NativeType<T>;
       const base::string name = customName(element, property.name);
+      addKeptProperty(*m_currentMesh,
+                      {property.word, element.word,
+                       faces ? static_cast<std::int32_t>(primitive) : KeptProperty::vertexElement, name});
       if (!property.isList) {
         auto& list = m_currentMesh->attribute<base::vector<Native>>(base::intern(name), base::vector<Native>());
         list.resize(initialCount(element));  // sized like the mesh's other lists

@@ -108,6 +108,8 @@ class PLYImporter final : public scene::SceneImportPlugin {
   /// Brings the current element's lists to one length when they grew with the data.
   void evenTargets();
   bool prepareVertices(const Element& element);
+  /// Removes what earlier vertex elements made: normals, vertex sets, kept vertex properties.
+  void dropVertexData();
   bool prepareIndices(const Element& element);
   void prepareMaterials(const Element& element);
   template <class T>

@@ -1,9 +1,11 @@
 #include "ply_mesh_layout.h"
 
 #include "b_exception.h"
+#include "b_log.h"
 #include "b_normal.h"
 #include "b_plugin_attribute.h"
 #include "b_vec.h"
+#include "ply_kept_properties.h"
 #include "scene_index_delta.h"
 #include "scene_mesh.h"
 #include "scene_schema.h"
@@ -12,6 +14,7 @@
 
 #include <algorithm>
 #include <cstring>
+#include <optional>
 
 namespace ply {
 namespace {
@@ -162,7 +165,7 @@ MeshLayout::MeshLayout(const base::AttribMap& mesh, const ExportOptions& options
   addVertexElement(options);
   if (const base::AttribArray* primitives = scene::findArrayMember(mesh, mesh_schema::primitives())) {
     for (std::uint32_t k = 0; k < primitives->size(); ++k) {
-      if (const base::AttribMap* primitive = scene::mapAt(*primitives, k)) addPrimitive(*primitive, options);
+      if (const base::AttribMap* primitive = scene::mapAt(*primitives, k)) addPrimitive(*primitive, k, options);
     }
   }
   if (options.customProperties) addCustomProperties();
@@ -172,12 +175,21 @@ MeshLayout::MeshLayout(const base::AttribMap& mesh, const ExportOptions& options
 namespace {
 
 // The vertices' count: the positions', or for a mesh without positions the length of its
-// normals or of the first kept list that is not a face's.
+// normals or of its first kept vertex property (for a scene stored before kept properties
+// named their element, of the first kept list that is not a face's).
 std::uint64_t vertexCountOf(const base::AttribMap& mesh) {
   if (const auto* positions = scene::listMember<base::base_vec3<float>>(mesh, mesh_schema::positions())) {
     return positions->size();
   }
   if (const auto* normals = scene::listMember<base::normal>(mesh, mesh_schema::normals())) return normals->size();
+  const base::vector<KeptProperty> named = keptPropertiesOf(mesh);
+  for (const KeptProperty& property : named) {
+    if (property.primitive != KeptProperty::vertexElement) continue;
+    const base::Attribute* values = mesh.findMember(base::intern(property.attribute));
+    if (!values) values = mesh.findMember(base::intern(property.attribute + ".counts"));
+    if (values) return values->size();
+  }
+  if (!named.empty()) return 0;
   for (const KeptList& kept : keptListsOf(mesh)) {
     if (!kept.name.starts_with("ply:face.") && !kept.name.ends_with(".items")) return kept.member->size();
   }
@@ -250,7 +262,7 @@ void MeshLayout::addVertexColourSets(WriteElement& vertex) {
   }
 }
 
-void MeshLayout::addPrimitive(const base::AttribMap& primitive, const ExportOptions& options) {
+void MeshLayout::addPrimitive(const base::AttribMap& primitive, std::uint32_t index, const ExportOptions& options) {
   const std::uint32_t start =
       scene::scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexStart()).value_or(0);
   const std::uint32_t corners =
@@ -275,11 +287,11 @@ void MeshLayout::addPrimitive(const base::AttribMap& primitive, const ExportOpti
     m_elements.push_back(WriteElement{"edge", corners / 2, {indices}});
     return;
   }
-  addFaceElement(primitive, start, corners, options);
+  addFaceElement(primitive, index, start, corners, options);
 }
 
-void MeshLayout::addFaceElement(const base::AttribMap& primitive, std::uint32_t start, std::uint32_t corners,
-                                const ExportOptions& options) {
+void MeshLayout::addFaceElement(const base::AttribMap& primitive, std::uint32_t index, std::uint32_t start,
+                                std::uint32_t corners, const ExportOptions& options) {
   WriteProperty indices = scalar("vertex_indices", DataType::int32, m_indices.data() + start, 4);
   indices.isList = true;
   WriteElement face{"face", 0, {}};
@@ -313,6 +325,8 @@ void MeshLayout::addFaceElement(const base::AttribMap& primitive, std::uint32_t 
     refuse("a PLY face element holds one texture coordinate list and one colour; these faces have more");
   }
   if (m_firstFaceElement == 0) m_firstFaceElement = m_elements.size();
+  if (m_faceElementOf.size() <= index) m_faceElementOf.resize(std::size_t(index) + 1, 0);
+  m_faceElementOf[index] = m_elements.size();
   m_elements.push_back(std::move(face));
 }
 
@@ -365,48 +379,97 @@ void MeshLayout::addFaceColours(WriteElement& face, const base::AttribMap& set, 
   addChannels(face, values, face.count, list.channels, colourNames("", list.channels));
 }
 
+namespace {
+
+// The column of a kept property whose values lie in the mesh member `stem` (a scalar per
+// instance) or in `stem.counts` and `stem.items` (a list per instance); none when the mesh
+// holds no such lists. `instances` becomes the number of instances.
+std::optional<WriteProperty> keptColumn(const std::vector<KeptList>& kept, std::string_view stem,
+                                        std::uint64_t& instances) {
+  const auto find = [&](std::string_view name) -> const base::Attribute* {
+    const auto found = std::find_if(kept.begin(), kept.end(), [&](const KeptList& list) { return list.name == name; });
+    return found == kept.end() ? nullptr : found->member;
+  };
+  const std::string stemText(stem);
+  const base::Attribute* counts = find(stemText + ".counts");
+  const base::Attribute* items = counts ? find(stemText + ".items") : find(stem);
+  if (!items || (counts && counts->type() != base::TypeTraits<std::uint32_t>::n_array_name)) {
+    return std::nullopt;
+  }
+  const DataType type = keptListType(items->type());
+  if (type == DataType::none) return std::nullopt;
+  WriteProperty property = scalar("", type, const_cast<base::Attribute*>(items)->data(0), dataTypeSize(type));
+  instances = items->size();
+  if (counts) {
+    const auto* lengths = static_cast<const base::vector<std::uint32_t>*>(const_cast<base::Attribute*>(counts)->data());
+    std::uint64_t total = 0;
+    for (const std::uint32_t n : *lengths) total += n;
+    if (total != items->size()) refuse(fmt::format("kept property {}: its counts and items disagree", stem));
+    property.isList = true;
+    property.counts = lengths->data();
+    property.countType = countTypeFor(lengths->empty() ? 0 : *std::max_element(lengths->begin(), lengths->end()));
+    instances = lengths->size();
+  }
+  return property;
+}
+
+}  // namespace
+
 void MeshLayout::addCustomProperties() {
   const std::vector<KeptList> kept = keptListsOf(m_mesh);
-  for (const auto& [fullName, member] : kept) {
-    if (fullName.ends_with(".items")) continue;  // with its counts
-    std::string_view name = fullName.substr(4);
-    const bool list = name.ends_with(".counts");
-    if (list) name.remove_suffix(7);
-    const base::Attribute* items = member;
-    if (list) {
-      const std::string itemsName = std::string(fullName.substr(0, fullName.size() - 7)) + ".items";
-      const auto found =
-          std::find_if(kept.begin(), kept.end(), [&](const KeptList& list) { return list.name == itemsName; });
-      if (found == kept.end() || member->type() != base::TypeTraits<base::vector<std::uint32_t>>::n_name) continue;
-      items = found->member;
+  const base::vector<KeptProperty> named = keptPropertiesOf(m_mesh);
+  base::vector<std::string_view> placed;
+  for (const KeptProperty& property : named) {
+    std::uint64_t instances = 0;
+    std::optional<WriteProperty> column = keptColumn(kept, property.attribute, instances);
+    if (!column) continue;
+    placed.push_back(property.attribute);
+    const bool ofVertices = property.primitive == KeptProperty::vertexElement;
+    const std::size_t at = ofVertices ? 0
+                           : std::size_t(property.primitive) < m_faceElementOf.size()
+                               ? m_faceElementOf[property.primitive]
+                               : 0;
+    if (!ofVertices && at == 0) {
+      if (instances == 0) continue;  // the faces of an empty element: nothing to write
+      refuse(fmt::format("kept property {} belongs to primitive {}, which is no face element here",
+                         base::clipped(property.attribute), property.primitive));
     }
-    const DataType type = keptListType(items->type());
-    if (type == DataType::none) continue;
-    // A kept face property says so in its name when a vertex property took the plain one;
-    // otherwise its length tells.
-    const bool faceNamed = name.starts_with("face.");
-    if (faceNamed) name.remove_prefix(5);
-    const std::uint64_t instances = member->size();
-    WriteElement* element = &m_elements.front();
-    if (faceNamed || instances != m_vertexCount) {
-      if (m_firstFaceElement == 0 || m_elements[m_firstFaceElement].count != instances) {
-        refuse(fmt::format("kept property {} has {} entries: as many as neither the vertices nor the faces", fullName,
-                           instances));
-      }
-      element = &m_elements[m_firstFaceElement];
+    WriteElement& element = m_elements[at];
+    if (element.count != instances) {
+      refuse(fmt::format("kept property {} has {} entries for {} {}", base::clipped(property.attribute), instances,
+                         element.count, ofVertices ? "vertices" : "faces"));
     }
-    WriteProperty property = scalar(std::string(name), type, items->data(0), dataTypeSize(type));
-    if (list) {
-      const auto* counts = static_cast<const base::vector<std::uint32_t>*>(member->data());
-      std::uint64_t total = 0;
-      for (const std::uint32_t n : *counts) total += n;
-      if (total != items->size()) refuse(fmt::format("kept property {}: its counts and items disagree", fullName));
-      property.isList = true;
-      property.counts = counts->data();
-      property.countType = countTypeFor(counts->empty() ? 0 : *std::max_element(counts->begin(), counts->end()));
-    }
-    element->properties.push_back(property);
+    column->name = std::string(property.name);
+    element.properties.push_back(*column);
   }
+  for (const auto& [name, member] : kept) {
+    std::string_view stem = name;
+    if (stem.ends_with(".items")) continue;  // with its counts
+    if (stem.ends_with(".counts")) stem.remove_suffix(7);
+    if (std::find(placed.begin(), placed.end(), stem) != placed.end()) continue;
+    std::uint64_t instances = 0;
+    if (std::optional<WriteProperty> column = keptColumn(kept, stem, instances)) {
+      addUnnamedKeptList(stem, *column, instances);
+    }
+  }
+}
+
+void MeshLayout::addUnnamedKeptList(std::string_view member, WriteProperty property, std::uint64_t instances) {
+  // A kept face property says so in its name when a vertex property took the plain one;
+  // otherwise its length tells.
+  std::string_view name = member.substr(4);
+  const bool faceNamed = name.starts_with("face.");
+  if (faceNamed) name.remove_prefix(5);
+  WriteElement* element = &m_elements.front();
+  if (faceNamed || instances != m_vertexCount) {
+    if (m_firstFaceElement == 0 || m_elements[m_firstFaceElement].count != instances) {
+      refuse(fmt::format("kept property {} has {} entries: as many as neither the vertices nor the faces", member,
+                         instances));
+    }
+    element = &m_elements[m_firstFaceElement];
+  }
+  property.name = std::string(name);
+  element->properties.push_back(property);
 }
 
 void MeshLayout::addMaterials() {

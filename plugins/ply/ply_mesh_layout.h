@@ -47,12 +47,15 @@ class MeshLayout {
   void addVertexElement(const ExportOptions& options);
   void addVertexUVSets(WriteElement& vertex);
   void addVertexColourSets(WriteElement& vertex);
-  void addPrimitive(const base::AttribMap& primitive, const ExportOptions& options);
-  void addFaceElement(const base::AttribMap& primitive, std::uint32_t start, std::uint32_t corners,
+  void addPrimitive(const base::AttribMap& primitive, std::uint32_t index, const ExportOptions& options);
+  void addFaceElement(const base::AttribMap& primitive, std::uint32_t index, std::uint32_t start, std::uint32_t corners,
                       const ExportOptions& options);
   void addFaceUVs(WriteElement& face, const base::AttribMap& set, std::uint32_t start, const WriteProperty& faces);
   void addFaceColours(WriteElement& face, const base::AttribMap& set, std::uint32_t start, const WriteProperty& faces);
   void addCustomProperties();
+  /// A kept list that the mesh's `keptProperties` does not name (a scene stored before it
+  /// existed): on the vertices when it has their length, else on the first face element.
+  void addUnnamedKeptList(std::string_view member, WriteProperty property, std::uint64_t instances);
   void addMaterials();
   /// A copy of `values` that lives as long as the layout, for the elements to point at.
   template <class T>
@@ -61,7 +64,9 @@ class MeshLayout {
   const base::AttribMap& m_mesh;
   std::vector<WriteElement> m_elements;
   std::uint64_t m_vertexCount = 0;
-  std::size_t m_firstFaceElement = 0;     ///< index in m_elements; 0 when there is none
+  std::size_t m_firstFaceElement = 0;  ///< index in m_elements; 0 when there is none
+  /// For each primitive, the index in m_elements of its face element; 0 when it has none.
+  base::vector<std::size_t> m_faceElementOf;
   base::vector<std::uint32_t> m_indices;  ///< decoded
   KeptStorage m_kept;
 };

@@ -5,9 +5,11 @@
 
 #include "b_attrib_array.h"
 #include "b_exception.h"
+#include "b_log.h"
 #include "b_normal.h"
 #include "b_vec.h"
 #include "ply_columns.h"
+#include "ply_kept_properties.h"
 #include "ply_mesh_layout.h"
 #include "scene_index_delta.h"
 #include "scene_mesh.h"
@@ -79,6 +81,12 @@ void mergeSets(base::AttribMap& merged, const std::vector<const base::AttribMap*
 
 // The kept per-vertex lists; a kept per-face list refuses the merge.
 void mergeKept(base::AttribMap& merged, const std::vector<const base::AttribMap*>& meshes) {
+  for (const KeptProperty& property : keptPropertiesOf(*meshes.front())) {
+    if (property.primitive != KeptProperty::vertexElement) {
+      refuse(fmt::format("a mesh has kept per-face properties ({})", base::clipped(property.name)));
+    }
+    addKeptProperty(merged, property);
+  }
   for (const auto& [name, member] : meshes.front()->members()) {
     if (!base::text(name).starts_with("ply:")) continue;
     const auto* positions = scene::listMember<base::base_vec3<float>>(*meshes.front(), mesh_schema::positions());

@@ -61,6 +61,11 @@ TEST(AttribMap, MembersStaySortedByHandle) {
   for (const char* name : {"zeta", "alpha", "mid", "beta", "omega"}) map.attribute<int>(base::intern(name)) = 1;
   const auto& members = map.members();
   for (std::size_t k = 1; k < members.size(); ++k) EXPECT_LT(members[k - 1].first, members[k].first);
+  EXPECT_TRUE(map.removeMember("mid"_n));
+  EXPECT_FALSE(map.removeMember("mid"_n));
+  EXPECT_EQ(map.size(), 4u);
+  EXPECT_EQ(map.findMember("mid"_n), nullptr);
+  EXPECT_NE(map.findMember("omega"_n), nullptr);
 }
 
 TEST(AttribMap, FindLogsTypeMismatchesAndNeverCreates) {

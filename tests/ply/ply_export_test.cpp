@@ -20,6 +20,7 @@
 #include <fstream>
 #include <map>
 #include <optional>
+#include <set>
 #include <sstream>
 
 namespace {
@@ -391,6 +392,85 @@ TEST(PlyExport, SeveralMeshesOfOneLayoutGoToOneFileWhenAsked) {
               exportScene(mixed, path, {"exportMergeMeshes=true"});
             }).rfind(path + ": the meshes cannot go into one file: ", 0),
             0u);
+}
+
+// Each face of primitive `p`, known by its vertices, with its entry of the kept float list `name`.
+std::map<std::set<std::uint32_t>, float> keptPerFace(const ImportedScene& imported, std::uint32_t p,
+                                                     const std::string& name) {
+  const base::vector<std::uint32_t> indices = scene::decodedIndices(imported.mesh());
+  const auto& values = testing_support::list<float>(imported.mesh(), base::intern(name));
+  const base::AttribMap& primitive = imported.primitive(p);
+  const std::uint32_t start = *scene::scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexStart());
+  const std::uint32_t count = *scene::scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexCount());
+  std::map<std::set<std::uint32_t>, float> faces;
+  for (std::uint32_t f = 0; 3 * f < count; ++f) {
+    faces[{indices.begin() + start + 3 * f, indices.begin() + start + 3 * f + 3}] = values.at(f);
+  }
+  return faces;
+}
+
+// The properties of each element of a written file, by element name.
+std::vector<std::pair<std::string, std::vector<std::string>>> writtenLayout(const std::string& path) {
+  const std::string text = readText(path);
+  base::Stream stream = base::memStream(text.data(), static_cast<std::int64_t>(text.size()));
+  ply::Header header;
+  testing_support::LogCapture quiet;
+  EXPECT_TRUE(ply::parseHeader(header, stream));
+  std::vector<std::pair<std::string, std::vector<std::string>>> layout;
+  for (const ply::Element& element : header.elements) {
+    layout.emplace_back(std::string(element.word), std::vector<std::string>{});
+    for (const ply::Property& property : element.properties) layout.back().second.emplace_back(property.word);
+  }
+  return layout;
+}
+
+TEST(PlyExport, KeptPropertiesGoBackToTheElementTheyCameFrom) {
+  testing_support::LogCapture quiet;
+  // As many faces as vertices, and two face elements that carry the same name.
+  const std::string file = testing_support::asciiHeader +
+                           "element vertex 4\nproperty float x\nproperty float y\nproperty float z\n"
+                           "element face 4\nproperty list uchar int vertex_indices\nproperty float quality\n"
+                           "element face 2\nproperty list uchar int vertex_indices\nproperty float quality\n"
+                           "end_header\n0 0 0\n1 0 0\n0 1 0\n0 0 1\n"
+                           "3 0 1 2 10\n3 0 2 3 20\n3 1 2 3 30\n3 0 1 3 40\n3 2 1 0 50\n3 3 2 0 60\n";
+  const testing_support::TemporaryFile source("tetrahedron.ply", file);
+  const testing_support::Switches keep{{"importCustomProperties", true}};
+  const ImportedScene imported = importFile(source.path(), true, keep);
+  const auto first = keptPerFace(imported, 0, "ply:quality");
+  const auto second = keptPerFace(imported, 1, "ply:face.quality");
+  EXPECT_EQ(first, (std::map<std::set<std::uint32_t>, float>{
+                       {{0, 1, 2}, 10.0f}, {{0, 2, 3}, 20.0f}, {{1, 2, 3}, 30.0f}, {{0, 1, 3}, 40.0f}}));
+  EXPECT_EQ(second, (std::map<std::set<std::uint32_t>, float>{{{0, 1, 2}, 50.0f}, {{0, 2, 3}, 60.0f}}));
+  const ExportFolder folder;
+  for (const std::string encoding : encodings) {
+    const std::string path = folder.file(encoding + ".ply");
+    ASSERT_TRUE(exportScene(imported, path, formatEntries(encoding)));
+    EXPECT_EQ(writtenLayout(path),
+              (std::vector<std::pair<std::string, std::vector<std::string>>>{{"vertex", {"x", "y", "z"}},
+                                                                             {"face", {"vertex_indices", "quality"}},
+                                                                             {"face", {"vertex_indices", "quality"}}}))
+        << encoding;
+    const ImportedScene again = importFile(path, true, keep);
+    EXPECT_EQ(keptPerFace(again, 0, "ply:quality"), first) << encoding;
+    EXPECT_EQ(keptPerFace(again, 1, "ply:face.quality"), second) << encoding;
+  }
+  // A scene stored before kept properties named their element places its lists by their
+  // names and lengths, as then: four entries are the vertices', and two fit no element.
+  imported.mesh().removeMember(base::intern("keptProperties"));
+  const std::string old = folder.file("old.ply");
+  EXPECT_NE(stream_tests::thrownText([&] {
+              exportScene(imported, old);
+            }).find("kept property ply:face.quality has 2 entries: as many as neither the vertices nor the faces"),
+            std::string::npos);
+  const ImportedScene single =
+      testing_support::importText(testing_support::asciiHeader +
+                                      "element vertex 3\nproperty float x\nproperty float y\nproperty float z\n"
+                                      "element face 3\nproperty list uchar int vertex_indices\nproperty float "
+                                      "quality\nend_header\n0 0 0\n1 0 0\n0 1 0\n3 0 1 2 1\n3 0 2 1 2\n3 1 0 2 3\n",
+                                  true, keep);
+  single.mesh().removeMember(base::intern("keptProperties"));
+  ASSERT_TRUE(exportScene(single, old));
+  EXPECT_EQ(writtenLayout(old)[0].second, (std::vector<std::string>{"x", "y", "z", "quality"}));
 }
 
 }  // namespace

@@ -1,6 +1,7 @@
 // Custom properties kept by importCustomProperties: typed mesh lists named "ply:NAME", lists
 // as ".counts" and ".items", per-face ones in the order the delta encoding gives the faces.
 
+#include "b_json.h"
 #include "b_normal.h"
 #include "b_vec.h"
 #include "log_capture.h"
@@ -168,6 +169,45 @@ TEST(CustomProperties, PerFaceOnesFollowTheFacesIntoTheirEncodedOrder) {
     }
     EXPECT_EQ(item, items.size());
   }
+}
+
+TEST(CustomProperties, TheRecordNamesEachPropertysElementAsWritten) {
+  LogCapture quiet;
+  const ImportedScene imported =
+      importText(asciiHeader +
+                     "element vertex 3\nproperty float x\nproperty int quality\nelement face 1\nproperty list uchar "
+                     "int vertex_indices\nproperty float quality\nend_header\n0 7\n1 8\n2 9\n3 0 1 2 0.5\n",
+                 true, keep);
+  base::JsonWriter writer;
+  scene::findArrayMember(imported.mesh(), base::intern("keptProperties"))->writeValue(writer);
+  EXPECT_EQ(writer.text(),
+            "[{\"attribute^string\":\"ply:quality\",\"element^string\":\"vertex\",\"name^string\":\"quality\","
+            "\"primitive^int32\":-1},{\"attribute^string\":\"ply:face.quality\",\"element^string\":\"face\","
+            "\"name^string\":\"quality\",\"primitive^int32\":0}]");
+}
+
+TEST(CustomProperties, AVertexElementThatComesAgainReplacesAllVertexData) {
+  LogCapture log(base::logWarning);
+  const ImportedScene imported = importText(
+      asciiHeader +
+          "element vertex 2\nproperty float x\nproperty float nx\nproperty float u\nproperty float v\nproperty uchar "
+          "red\nproperty uchar green\nproperty uchar blue\nproperty int quality\n"
+          "element vertex 3\nproperty float x\nproperty short quality\nproperty short weight\n"
+          "end_header\n0 1 0 0 1 2 3 4\n1 1 0 0 1 2 3 5\n10 -1 11\n20 -2 21\n30 -3 31\n",
+      true, keep);
+  const base::AttribMap& mesh = imported.mesh();
+  EXPECT_EQ(list<base::base_vec3<float>>(mesh, mesh_schema::positions()).size(), 3u);
+  EXPECT_EQ(mesh.findMember(mesh_schema::normals()), nullptr);
+  EXPECT_EQ(testing_support::arraySize(mesh, mesh_schema::uvSets()), 0u);
+  EXPECT_EQ(testing_support::arraySize(mesh, mesh_schema::colorSets()), 0u);
+  EXPECT_EQ(kept<std::int16_t>(mesh, "ply:quality"), (base::vector<std::int16_t>{-1, -2, -3}));
+  EXPECT_EQ(kept<std::int16_t>(mesh, "ply:weight"), (base::vector<std::int16_t>{11, 21, 31}));
+  EXPECT_EQ(keptCount(mesh), 2u);
+  EXPECT_EQ(testing_support::arraySize(mesh, base::intern("keptProperties")), 2u);
+  const std::vector<std::string> texts = log.texts();
+  EXPECT_NE(std::find(texts.begin(), texts.end(),
+                      "Element 'vertex' appears again: its vertices replace the earlier ones, with all their data"),
+            texts.end());
 }
 
 }  // namespace
