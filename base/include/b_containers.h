@@ -32,6 +32,13 @@ void reserveForAppend(Container& container, std::size_t extra) {
   }
 }
 
+/// Frees the container's storage. (`container = {}` keeps it: that assigns an empty
+/// initializer list, which clears without giving the room back.)
+template <class Container>
+void release(Container& container) {
+  Container().swap(container);
+}
+
 /// Appends one element by the growth rule.
 template <class Container, class Value>
 void append(Container& container, Value&& value) {

@@ -72,6 +72,9 @@ class BASE1_API PluginVectorAttribute : public Attribute {
 
   const base::vector<ref<IPlugin>>& objects() const { return m_objects; }
   const base::vector<std::uint32_t>& ids() const { return m_ids; }
+  /// Takes `objects` as the list without copying it (a long list need not exist twice); the
+  /// ids follow.
+  void assign(base::vector<ref<IPlugin>>&& objects);
   void bind(PluginFactory& factory, std::uint32_t first, std::string_view name);
   void replace(const IPlugin* old, const ref<IPlugin>& replacement);
   /// Refers to nothing.

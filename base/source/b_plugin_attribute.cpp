@@ -211,6 +211,11 @@ void PluginVectorAttribute::replace(const IPlugin* old, const ref<IPlugin>& repl
   syncIds();
 }
 
+void PluginVectorAttribute::assign(base::vector<ref<IPlugin>>&& objects) {
+  m_objects = std::move(objects);
+  syncIds();
+}
+
 void PluginVectorAttribute::syncIds() {
   m_ids.resize(m_objects.size());
   std::transform(m_objects.begin(), m_objects.end(), m_ids.begin(), idOf);

@@ -199,8 +199,8 @@ void PLYImporter::finishFaceUVs(std::uint32_t start, std::uint32_t corners,
   } else {
     spreadFaceUVs(uvs, sources);
   }
-  m_faceItems = {};
-  m_faceItemCounts = {};
+  base::release(m_faceItems);
+  base::release(m_faceItemCounts);
 }
 
 void PLYImporter::spreadFaceUVs(base::vector<base::base_vec2<float>>& uvs, const base::vector<std::uint32_t>& sources) {

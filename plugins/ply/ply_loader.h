@@ -12,6 +12,7 @@
 #include <array>
 #include <cstdint>
 #include <functional>
+#include <limits>
 #include <string_view>
 
 namespace ply {
@@ -34,6 +35,18 @@ ListTarget listTarget(base::vector<T>& list) {
           },
           [&list] { return list.size(); }, sizeof(T)};
 }
+
+/// What an entry of a material element makes of a principalMaterial: the attributes it
+/// sets. Entries with equal values (bit for bit) share one material object.
+struct MaterialValues {
+  enum : std::uint8_t { hasVisibility = 1, hasColour = 2, hasReflection = 4, hasRoughness = 8 };
+  std::uint8_t present = 0;
+  base::base_vec3<float> visibility{};
+  base::base_vec3<float> colour{};
+  float reflection = 0;
+  float roughness = 0;
+  bool operator==(const MaterialValues& other) const;
+};
 
 /// The semantic the importer reads a property as: its own, or for names that other tools
 /// give texture coordinates (texture_u/texture_v, texture_s/texture_t) u and v. The header
@@ -148,6 +161,11 @@ class PLYImporter final : public scene::SceneImportPlugin {
   base::AttribMap& newPrimitive();
   void finishPrimitives();
   void createMaterials(base::PluginFactory& factory);
+  MaterialValues materialValues(std::size_t j) const;
+  base::ref<base::IPlugin> createMaterial(base::PluginFactory& factory, const MaterialValues& values);
+  /// The most distinct materials that `entries` material instances may make.
+  std::size_t materialLimit(std::size_t entries) const;
+  [[noreturn]] void refuseMaterials(std::size_t entries, std::size_t limit) const;
   void buildScene(base::PluginFactory& factory);
 
   // Parameters (mirrored by attributes of the same names).
@@ -186,6 +204,8 @@ class PLYImporter final : public scene::SceneImportPlugin {
   /// Which of the five material lists (ambient, diffuse, specular, power, opacity) the
   /// current material element fills.
   std::array<bool, 5> m_materialPresent{};
+  /// The fewest bytes a material instance of the file takes.
+  std::uint64_t m_materialBytesPerEntry = std::numeric_limits<std::uint64_t>::max();
 
   // The current element: its lists, the route of each property, its index sink.
   const Element* m_element = nullptr;

@@ -38,6 +38,8 @@ TEST(GrowthRule, AppendFollowsTheRule) {
   }
   EXPECT_EQ(capacities, (std::vector<std::size_t>{1, 2, 4, 4, 8, 8, 8, 8, 16}));
   EXPECT_EQ(values.back(), 8u);
+  base::release(values);
+  EXPECT_EQ(values.capacity(), 0u);
 }
 
 }  // namespace

@@ -250,7 +250,8 @@ TEST(PlyImport, MaterialsFollowTheirFormulas) {
   for (const auto& object : imported.scene->objects()) {
     if (object->mapType() == principalMaterial_schema::typeName()) materials.push_back(object.get());
   }
-  ASSERT_EQ(materials.size(), 4u);
+  // The last two entries make equal materials: they share one.
+  ASSERT_EQ(materials.size(), 3u);
   const Vec3 colour = *materials[0]->findAttribute<Vec3>(principalMaterial_schema::color());
   EXPECT_EQ(colour.x, 1.0f);
   EXPECT_FLOAT_EQ(colour.y, 0.5019608f);
@@ -263,10 +264,37 @@ TEST(PlyImport, MaterialsFollowTheirFormulas) {
   EXPECT_EQ(*materials[1]->findAttribute<Vec3>(principalMaterial_schema::visibilityMap()), (Vec3{0.5f, 0.5f, 0.5f}));
   EXPECT_EQ(*materials[2]->findAttribute<float>(principalMaterial_schema::roughness()), 0.0f);
   EXPECT_EQ(materials[2]->findAttribute<Vec3>(principalMaterial_schema::visibilityMap()), nullptr);  // NaN is opaque
-  EXPECT_EQ(*materials[3]->findAttribute<float>(principalMaterial_schema::roughness()), 0.0f);
   const auto& attached = list<base::ref<base::IPlugin>>(imported.primitive(0), meshPrimitive_schema::materials());
   ASSERT_EQ(attached.size(), 4u);
-  EXPECT_EQ(attached[3].get(), materials[3]);
+  EXPECT_EQ(attached[0].get(), materials[0]);
+  EXPECT_EQ(attached[2].get(), materials[2]);
+  EXPECT_EQ(attached[3].get(), materials[2]);
+}
+
+TEST(PlyImport, MaterialsCostNoMoreThanTheirShareOfTheMemoryBound) {
+  // A million one-byte entries of 256 values make 256 materials; distinct floats beyond what
+  // the element's bytes allow are refused before any is made.
+  const auto materialFile = [](std::uint32_t count, const std::string& type, const std::string& body) {
+    return "ply\nformat binary_little_endian 1.0\nelement material " + std::to_string(count) + "\nproperty " + type +
+           " diffuse_red\nend_header\n" + body;
+  };
+  std::string bytes(1000000, '\0');
+  for (std::size_t k = 0; k < bytes.size(); ++k) bytes[k] = static_cast<char>(k * 7);
+  const ImportedScene shared = importText(materialFile(1000000, "uchar", bytes));
+  std::size_t made = 0;
+  for (const auto& object : shared.scene->objects()) made += object->mapType() == principalMaterial_schema::typeName();
+  EXPECT_EQ(made, 256u);
+  EXPECT_EQ(list<base::ref<base::IPlugin>>(shared.primitive(0), meshPrimitive_schema::materials()).size(), 1000000u);
+  std::string floats;
+  for (std::uint32_t k = 0; k < 100000; ++k) {
+    const float value = static_cast<float>(k);
+    floats.append(reinterpret_cast<const char*>(&value), 4);
+  }
+  testing_support::LogCapture quiet;
+  const std::string refused = stream_tests::thrownText([&] { importText(materialFile(100000, "float", floats)); });
+  EXPECT_NE(refused.find("element 'material': its 100000 instances hold more than 11317 distinct materials"),
+            std::string::npos)
+      << refused;
 }
 
 TEST(PlyImport, ASpecularPowerAloneMakesNoMaterial) {

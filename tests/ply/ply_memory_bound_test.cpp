@@ -79,7 +79,19 @@ TEST(MemoryBound, DenseFilesStayWithinTheMultiple) {
       "element face " +
       std::to_string(count) + "\nproperty list uchar uint vertex_indices\nend_header\n" + std::string(4, '\0') +
       std::string(count, '\0');
-  for (const std::string& content : {vertices, faces}) {
+  // A million one-byte materials (256 distinct ones), and as many distinct float materials
+  // as a material element of its size may make.
+  std::string materials = "ply\nformat binary_little_endian 1.0\nelement material " + std::to_string(count) +
+                          "\nproperty uchar diffuse_red\nend_header\n";
+  for (std::size_t k = 0; k < count; ++k) materials += static_cast<char>(k * 7);
+  std::string distinct =
+      "ply\nformat binary_little_endian 1.0\nelement material 100000\nproperty float "
+      "diffuse_red\nend_header\n";
+  for (std::uint32_t k = 0; k < 100000; ++k) {
+    const float value = static_cast<float>(k % 11000);
+    distinct.append(reinterpret_cast<const char*>(&value), sizeof value);
+  }
+  for (const std::string& content : {vertices, faces, materials, distinct}) {
     const testing_support::TemporaryFile file("dense.ply", content);
     EXPECT_EXIT(importUnderLimit(file.path()), ::testing::ExitedWithCode(0), "^$") << content.substr(0, 120);
   }

@@ -77,7 +77,7 @@ class MemStreamWorker final : public StreamWorker {
   }
   bool isEOF() override { return m_position >= m_size; }
   void close() override {
-    m_block = {};
+    base::release(m_block);
     m_data = nullptr;
     m_size = 0;
     m_position = 0;
@@ -153,7 +153,7 @@ class MemBlockStreamWorker final : public StreamWorker {
   }
   bool isEOF() override { return m_position >= m_size; }
   void close() override {
-    m_blocks = {};
+    base::release(m_blocks);
     StreamWorker::close();
   }
 
