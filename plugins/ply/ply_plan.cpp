@@ -3,6 +3,8 @@
 #include "b_log.h"
 #include "ply_columns.h"
 
+#include <fmt/format.h>
+
 #include <algorithm>
 
 namespace ply {
@@ -69,10 +71,11 @@ void BadIndexReport::note(std::uint32_t index, std::uint32_t vertexCount) {
 }
 
 void BadIndexReport::finish(const Element& element) {
-  if (m_count > linesPerElement) {
-    base::log().message(base::logScene, base::logError,
-                        "{} invalid vertex indices in element '{}' were stored as 0 (the first {} are listed above)",
-                        m_count, base::clipped(displayName(element)), linesPerElement);
+  if (m_count > 0) {
+    base::log().message(base::logScene, base::logError, "Element '{}': {} invalid vertex {} stored as 0{}",
+                        base::clipped(displayName(element)), m_count, m_count == 1 ? "index was" : "indices were",
+                        m_count > linesPerElement ? fmt::format(" (the first {} are listed above)", linesPerElement)
+                                                  : std::string());
   }
   m_count = 0;
 }

@@ -105,14 +105,15 @@ struct ElementPlan {
 };
 
 /// Reports indices that are not below the vertex count: the first few with their own line
-/// ("Invalid vertex index detected 812, max 800!"), the rest as one total when the element
-/// ends, so that a file with millions of bad indices neither floods the log nor crawls.
+/// ("Invalid vertex index detected 812, max 800!"), then one line with the element's name and
+/// the total when the element ends, so that a file with millions of bad indices neither
+/// floods the log nor crawls, and the log says where they were.
 class BadIndexReport {
  public:
   static constexpr std::uint64_t linesPerElement = 10;
 
   void note(std::uint32_t index, std::uint32_t vertexCount);
-  /// Logs the total beyond the first lines, if any, and starts over.
+  /// Logs the element's total, if any, and starts over.
   void finish(const Element& element);
 
  private:

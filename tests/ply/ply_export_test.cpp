@@ -31,9 +31,11 @@ using scene::meshColorSet_schema;
 using scene::meshPrimitive_schema;
 using scene::meshUVSet_schema;
 using testing_support::ImportedScene;
+using testing_support::encodings;
+using testing_support::exportScene;
+using testing_support::formatEntries;
 using testing_support::importFile;
 
-constexpr const char* encodings[] = {"ascii", "binary_little_endian", "binary_big_endian"};
 
 // A fresh folder for the files one test writes.
 class ExportFolder {
@@ -54,24 +56,6 @@ class ExportFolder {
  private:
   stdfs::path m_path;
 };
-
-// Exports `scene` to `path` with the exporter's defaults and `entries` (NAME=VALUE).
-bool exportScene(const ImportedScene& imported, const std::string& path, const std::vector<std::string>& entries = {}) {
-  base::AttribMap parameters;
-  scene::SceneFactory& factory = testing_support::pluginFactory();
-  EXPECT_TRUE(factory.getExporterParameters(path, parameters));
-  for (const std::string& entry : entries) {
-    const std::size_t equals = entry.find('=');
-    base::Attribute** slot = parameters.findAttributeMutable(base::intern(entry.substr(0, equals)));
-    EXPECT_TRUE(slot && *slot && (*slot)->fromString(entry.substr(equals + 1))) << entry;
-  }
-  return factory.save(*imported.scene, path, parameters);
-}
-
-std::vector<std::string> formatEntries(const std::string& encoding) {
-  if (encoding == "ascii") return {"exportBinary=false"};
-  return {"exportBinary=true", encoding == "binary_big_endian" ? "exportBigEndian=true" : "exportBigEndian=false"};
-}
 
 // A list member in its structured form, or none: floats are written so that they read back
 // to the same bits, so equal texts are equal lists.

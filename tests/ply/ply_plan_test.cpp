@@ -428,7 +428,7 @@ TEST(PlyPlan, StripsWithRestartMarkersAndManyBadIndices) {
   ASSERT_EQ(planned.log.size(), ply::BadIndexReport::linesPerElement + 1);
   EXPECT_EQ(planned.log.front(), "Invalid vertex index detected 7, max 3!");
   EXPECT_EQ(planned.log.back(),
-            "31 invalid vertex indices in element 'tristrips' were stored as 0 (the first 10 are listed above)");
+            "Element 'tristrips': 31 invalid vertex indices were stored as 0 (the first 10 are listed above)");
 }
 
 TEST(PlyPlan, ListsLongerThanTheSinkTakesGoToTheReceiver) {

@@ -12,6 +12,8 @@
 #include "scene_schema.h"
 #include "scene_schema_registry.h"
 
+#include <gtest/gtest.h>
+
 #include <filesystem>
 #include <fstream>
 #include <string>
@@ -74,6 +76,30 @@ inline ImportedScene importFile(const std::string& path, bool plans = true, cons
   if (!plans) parameters.attribute(base::intern("plyColumnPlans"), false);
   imported.loaded = pluginFactory().load(*imported.scene, path, parameters);
   return imported;
+}
+
+/// The encodings by the words of their format lines.
+inline constexpr const char* encodings[] = {"ascii", "binary_little_endian", "binary_big_endian"};
+
+/// Exports `imported` to `path` through the plug-in that writes its extension, with the
+/// exporter's defaults and `entries` (NAME=VALUE).
+inline bool exportScene(const ImportedScene& imported, const std::string& path,
+                        const std::vector<std::string>& entries = {}) {
+  base::AttribMap parameters;
+  scene::SceneFactory& factory = pluginFactory();
+  EXPECT_TRUE(factory.getExporterParameters(path, parameters));
+  for (const std::string& entry : entries) {
+    const std::size_t equals = entry.find('=');
+    base::Attribute** slot = parameters.findAttributeMutable(base::intern(entry.substr(0, equals)));
+    EXPECT_TRUE(slot && *slot && (*slot)->fromString(entry.substr(equals + 1))) << entry;
+  }
+  return factory.save(*imported.scene, path, parameters);
+}
+
+/// The exporter's parameters that choose `encoding` (one of `encodings`).
+inline std::vector<std::string> formatEntries(const std::string& encoding) {
+  if (encoding == "ascii") return {"exportBinary=false"};
+  return {"exportBinary=true", encoding == "binary_big_endian" ? "exportBigEndian=true" : "exportBigEndian=false"};
 }
 
 /// A file in a fresh temporary folder, removed with the object.
