@@ -46,7 +46,8 @@ class BASE1_API AttribMap : public Attribute {
   void write(Stream& stream, BinaryContext& context) const override;
   /// Reads the members back, inserted at their places (an existing member of the same name is
   /// replaced). A member of a type the factory does not know is skipped by its length, with a
-  /// warning; reading goes on with the next one.
+  /// warning; reading goes on with the next one. Maps and arrays nested deeper than
+  /// BinaryContext::deepest levels throw.
   void read(Stream& stream, BinaryContext& context) override;
   /// Index -1: the member array (Members*); otherwise member `index`'s value.
   void* data(int index = -1) override;

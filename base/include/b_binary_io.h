@@ -21,8 +21,26 @@ class Attribute;
 static_assert(std::endian::native == std::endian::little, "the binary forms are written as the machine holds them");
 
 /// How the binary forms store member names, type names and references to plug-in objects.
+/// A read also counts in its context how deep it is inside maps and arrays.
 class BASE1_API BinaryContext {
  public:
+  /// The deepest nesting of maps and arrays that a read accepts, as for JSON: the reader
+  /// recurses, and a hostile input must not exhaust its stack.
+  static constexpr std::uint32_t deepest = 256;
+
+  /// One level of map or array nesting, counted in the context for as long as it lives.
+  /// Entering a level deeper than `deepest` throws base::exception, naming the stream.
+  class BASE1_API Level {
+   public:
+    Level(BinaryContext& context, Stream& stream);
+    ~Level() { --m_context.m_depth; }
+    Level(const Level&) = delete;
+    Level& operator=(const Level&) = delete;
+
+   private:
+    BinaryContext& m_context;
+  };
+
   virtual ~BinaryContext();
   /// A member name. The plain form: the text's byte length (32 bits), then its bytes.
   virtual void writeName(Stream& stream, name_id name);
@@ -35,6 +53,9 @@ class BASE1_API BinaryContext {
   /// The id under which a reference to the plug-in object listed at `index` is stored;
   /// plainly the index itself.
   virtual std::uint32_t pluginId(std::uint32_t index) const;
+
+ private:
+  std::uint32_t m_depth = 0;
 };
 
 /// A table of names stored elsewhere, each name stored as its 16-bit position in it.
@@ -66,7 +87,8 @@ class BASE1_API StringIdContext : public BinaryContext {
   NameTable types;
 };
 
-/// The plain context, for callers that need no string table.
+/// The plain context, for callers that need no string table; one per thread, since reads
+/// count their nesting in it.
 BASE1_API BinaryContext& plainContext();
 
 namespace binary {

@@ -213,6 +213,7 @@ bool AttribMap::readValue(StructuredReader& reader) {
 }
 
 void AttribMap::read(Stream& stream, BinaryContext& context) {
+  const BinaryContext::Level level(context, stream);
   Attribute::read(stream, context);
   const std::uint32_t count = binary::readCount(stream, smallestMember, "map members");
   for (std::uint32_t k = 0; k < count; ++k) {

@@ -26,6 +26,15 @@ class ByteCounter final : public StreamWorker {
 
 }  // namespace
 
+BinaryContext::Level::Level(BinaryContext& context, Stream& stream) : m_context(context) {
+  if (context.m_depth >= deepest) {
+    raise<exception>("base::Attribute::read",
+                     fmt::format("stream '{}': the nesting of maps and arrays is deeper than {} levels",
+                                 clipped(stream.name()), deepest));
+  }
+  ++context.m_depth;
+}
+
 BinaryContext::~BinaryContext() = default;
 
 void BinaryContext::writeName(Stream& stream, name_id name) {
@@ -79,7 +88,7 @@ void NameTable::setNames(base::vector<name_id> names) {
 }
 
 BinaryContext& plainContext() {
-  static BinaryContext context;
+  static thread_local BinaryContext context;
   return context;
 }
 

@@ -1,6 +1,7 @@
 // The binary forms of attributes and maps: round trips, left-out members, members of types
 // the reader lacks, and inputs that end early or count more than they hold.
 
+#include "b_attrib_array.h"
 #include "b_attribute_map.h"
 #include "b_box.h"
 #include "b_color.h"
@@ -13,6 +14,7 @@
 #include "b_vec.h"
 #include "log_capture.h"
 #include "test_streams.h"
+#include "thrown.h"
 
 #include <gtest/gtest.h>
 
@@ -163,6 +165,52 @@ TEST(AttributeBinary, TruncatedAndHostileInputsFailCleanly) {
   base::Stream pipe = testing_support::fileLikeStream(std::string(hostile.begin(), hostile.end()), base::capRead);
   EXPECT_THROW(list.read(pipe, base::plainContext()), base::exception);
   EXPECT_LE(list.values().capacity(), 1u << 16);
+}
+
+// The plain binary form of `levels` maps (or arrays) each holding the next, the innermost
+// empty: built by hand, since nothing that writes would nest this deep.
+base::string nestedForm(std::uint32_t levels, bool arrays) {
+  const auto put = [](base::string& bytes, auto value) {
+    bytes.append(reinterpret_cast<const char*>(&value), sizeof value);
+  };
+  const auto putName = [&](base::string& bytes, std::string_view name) {
+    put(bytes, static_cast<std::uint32_t>(name.size()));
+    bytes.append(name);
+  };
+  // Each level but the innermost: its flags, one member (or element), the child's type and
+  // byte length; the children follow one another, so each length is what comes after it.
+  const std::size_t header = 1 + 4 + (arrays ? 0 : 4 + 1) + 4 + (arrays ? 5 : 3) + 4;
+  const std::size_t innermost = 1 + 4;
+  base::string bytes;
+  bytes.reserve((levels - 1) * header + innermost);
+  for (std::uint32_t level = 1; level < levels; ++level) {
+    put(bytes, std::uint8_t(0));
+    put(bytes, std::uint32_t(1));
+    if (!arrays) putName(bytes, "m");
+    putName(bytes, arrays ? "array" : "map");
+    put(bytes, static_cast<std::uint32_t>((levels - 1 - level) * header + innermost));
+  }
+  put(bytes, std::uint8_t(0));
+  put(bytes, std::uint32_t(0));
+  return bytes;
+}
+
+TEST(AttributeBinary, NestingDeeperThan256LevelsIsRefusedNotRecursedInto) {
+  for (const bool arrays : {false, true}) {
+    const auto readForm = [arrays](const base::string& bytes) {
+      base::Stream stream = base::memStream(bytes.data(), static_cast<std::int64_t>(bytes.size()), "deep");
+      std::unique_ptr<base::Attribute> attr(arrays ? static_cast<base::Attribute*>(new base::AttribArray)
+                                                   : new base::AttribMap);
+      attr->read(stream, base::plainContext());
+      return stream.getPosition() == stream.getSize();
+    };
+    const std::string refusal = "stream 'deep': the nesting of maps and arrays is deeper than 256 levels";
+    // Deep enough to overflow the stack of a reader that does not count.
+    EXPECT_EQ(stream_tests::thrownText([&] { readForm(nestedForm(40000, arrays)); }), refusal) << arrays;
+    EXPECT_EQ(stream_tests::thrownText([&] { readForm(nestedForm(257, arrays)); }), refusal) << arrays;
+    // The failed reads left the context's count where it was.
+    EXPECT_TRUE(readForm(nestedForm(256, arrays))) << arrays;
+  }
 }
 
 // A stored bool byte other than 0 or 1 reads as true and is written back as 1.
