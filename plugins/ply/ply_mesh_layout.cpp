@@ -275,6 +275,10 @@ void MeshLayout::addPrimitive(const base::AttribMap& primitive, std::uint32_t in
   WriteProperty indices = scalar("vertex_indices", DataType::int32, m_indices.data() + start, 4);
   indices.isList = true;
   if (const auto* strips = scene::listMember<std::uint32_t>(primitive, meshPrimitive_schema::ecounts())) {
+    // The writer takes each strip's indices in turn: together they must lie in the range.
+    std::uint64_t total = 0;
+    for (const std::uint32_t n : *strips) total += n;
+    if (total > corners) refuse(fmt::format("a primitive's strips have {} indices, its range {}", total, corners));
     indices.counts = strips->data();
     indices.countType = countTypeFor(strips->empty() ? 0 : *std::max_element(strips->begin(), strips->end()));
     m_elements.push_back(WriteElement{"tristrips", strips->size(), {indices}});

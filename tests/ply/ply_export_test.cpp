@@ -342,6 +342,25 @@ TEST(PlyExport, AFailedWriteNamesTheFileAndLeavesNothingBehind) {
   EXPECT_EQ(folder.names(), std::vector<std::string>{"taken.ply"});
 }
 
+// Strips read their indices run by run: runs that together pass the primitive's range would
+// make the writer read past the index list.
+TEST(PlyExport, StripsLongerThanTheirRangeAreRefused) {
+  const ImportedScene imported = importFile(MESHPORT_TEST_DATA "/ply/valid/binary_be_tristrips_material.ply");
+  base::AttribMap& primitive = imported.primitive(0);
+  auto* strips = const_cast<base::vector<std::uint32_t>*>(
+      scene::listMember<std::uint32_t>(primitive, meshPrimitive_schema::ecounts()));
+  ASSERT_TRUE(strips && !strips->empty());
+  const std::uint32_t range = *scene::scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexCount());
+  std::uint64_t total = 0;
+  for (const std::uint32_t n : *strips) total += n;
+  strips->back() += range - static_cast<std::uint32_t>(total) + 1000;
+  const ExportFolder folder;
+  const std::string path = folder.file("strips.ply");
+  EXPECT_EQ(stream_tests::thrownText([&] { exportScene(imported, path); }),
+            fmt::format("{}: a primitive's strips have {} indices, its range {}", path, range + 1000, range));
+  EXPECT_TRUE(folder.names().empty());
+}
+
 TEST(PlyExport, ASceneWithoutMeshesSaysSo) {
   const ImportedScene empty;
   const ExportFolder folder;
