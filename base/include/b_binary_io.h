@@ -9,6 +9,7 @@
 #include "b_name.h"
 #include "b_stream.h"
 
+#include <algorithm>
 #include <bit>
 #include <cstdint>
 #include <optional>
@@ -105,6 +106,32 @@ BASE1_API std::optional<std::uint64_t> bytesLeft(Stream& stream);
 /// Reads a 32-bit count of items that take at least `itemBytes` bytes each; a count that the
 /// bytes left cannot hold throws, naming `what`.
 BASE1_API std::uint32_t readCount(Stream& stream, std::uint64_t itemBytes, std::string_view what);
+
+/// Resizes `items` to `count` and fills it through `readItems(first, n)`, which reads items
+/// first to first + n - 1 into it. Where the stream can tell how much it has left, callers
+/// have checked `count` against it and `items` is sized once. Elsewhere nothing proves the
+/// count: `items` grows by 65,536 items at a time with the data that arrives, so that a
+/// hostile count over a few bytes ends in the short-read failure, not in a huge allocation.
+template <class Items, class ReadItems>
+void readInBatches(Stream& stream, Items& items, std::uint32_t count, ReadItems&& readItems) {
+  constexpr std::uint32_t batch = 1 << 16;
+  const bool proven = bytesLeft(stream).has_value();
+  items.clear();
+  for (std::uint32_t done = 0; done < count;) {
+    const std::uint32_t n = proven ? count - done : std::min(count - done, batch);
+    items.resize(std::size_t(done) + n);
+    readItems(done, n);
+    done += n;
+  }
+}
+
+/// readInBatches for items stored as their own bytes (numbers, text).
+template <class Items>
+void readPacked(Stream& stream, Items& items, std::uint32_t count) {
+  readInBatches(stream, items, count, [&](std::uint32_t first, std::uint32_t n) {
+    read(stream, items.data() + first, std::uint64_t(n) * sizeof(*items.data()));
+  });
+}
 
 /// Writes the binary form of `attr` preceded by its byte length (32 bits), so that a reader
 /// that cannot read it can skip it.

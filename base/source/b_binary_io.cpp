@@ -51,8 +51,8 @@ name_id BinaryContext::readName(Stream& stream) {
     raise<exception>("base::xdr_read", fmt::format("stream '{}': a name of {} bytes, but only {} bytes are left",
                                                    clipped(stream.name()), length, *left));
   }
-  base::string bytes(length, '\0');
-  binary::read(stream, bytes.data(), length);
+  base::string bytes;
+  binary::readPacked(stream, bytes, length);
   return intern(bytes);
 }
 

@@ -1,6 +1,7 @@
 // The binary forms of attributes and maps: round trips, left-out members, members of types
 // the reader lacks, and inputs that end early or count more than they hold.
 
+#include "address_limit.h"
 #include "b_attrib_array.h"
 #include "b_attribute_map.h"
 #include "b_box.h"
@@ -8,6 +9,8 @@
 #include "b_matrix.h"
 #include "b_murmurhash3.h"
 #include "b_normal.h"
+#include "b_plugin_attribute.h"
+#include "b_plugin_factory.h"
 #include "b_quat.h"
 #include "b_timecode.h"
 #include "b_typed_attribute.h"
@@ -212,6 +215,73 @@ TEST(AttributeBinary, NestingDeeperThan256LevelsIsRefusedNotRecursedInto) {
     EXPECT_TRUE(readForm(nestedForm(256, arrays))) << arrays;
   }
 }
+
+#if defined(MESHPORT_HAS_ADDRESS_LIMIT)
+
+// Runs `read` in a death-test child held to 64 MiB more than it holds. Exits with 0 when
+// the read fails with the short-read message, with allocationFailed when it ran out of
+// memory, with 4 on any other ending.
+template <class Read>
+[[noreturn]] void readUnderLimit(Read&& read) {
+  LogCapture quiet;
+  testing_support::limitAddressSpace(64u << 20);
+  try {
+    read();
+  } catch (const base::exception& error) {
+    _exit(std::string_view(error.what()).find("trying to read") != std::string_view::npos ? 0 : 4);
+  } catch (const std::bad_alloc&) {
+    _exit(testing_support::allocationFailed);
+  }
+  _exit(4);
+}
+
+// A count of up to 4 GiB over a few bytes from a stream that cannot tell its size: nothing
+// proves the count, so each form must grow with the data, never allocate the count first.
+TEST(AttributeBinary, CountsFromAStreamWithoutASizeAllocateOnlyWhatArrives) {
+  const auto bytes = [](std::initializer_list<std::uint8_t> head) {
+    std::string data(head.begin(), head.end());
+    return data + "abcdefgh";
+  };
+  const std::string text = bytes({0, 0xFF, 0xFF, 0xFF, 0xFF});
+  const std::string name = bytes({0, 0, 0, 0x10});                       // 256 MiB, the longest name allowed
+  const std::string objectList = bytes({1, 1, 0, 0, 0, 0, 0, 0, 0x10});  // one plug-in type of that name
+  for (const testing_support::Source source : {testing_support::Source::pipe, testing_support::Source::bufferedPipe}) {
+    const auto stream = [source](const std::string& data) { return testing_support::sourceStream(data, source); };
+    const char* kind = testing_support::sourceName(source);
+    EXPECT_EXIT(readUnderLimit([&] {
+                  base::Stream in = stream(text);
+                  base::TypedAttribute<base::string>().read(in, base::plainContext());
+                }),
+                ::testing::ExitedWithCode(0), "")
+        << "text, " << kind;
+    EXPECT_EXIT(readUnderLimit([&] {
+                  base::Stream in = stream(text);
+                  base::TypedVectorAttribute<double>().read(in, base::plainContext());
+                }),
+                ::testing::ExitedWithCode(0), "")
+        << "list, " << kind;
+    EXPECT_EXIT(readUnderLimit([&] {
+                  base::Stream in = stream(text);
+                  base::PluginVectorAttribute().read(in, base::plainContext());
+                }),
+                ::testing::ExitedWithCode(0), "")
+        << "plug-in references, " << kind;
+    EXPECT_EXIT(readUnderLimit([&] {
+                  base::Stream in = stream(name);
+                  base::plainContext().readName(in);
+                }),
+                ::testing::ExitedWithCode(0), "")
+        << "name, " << kind;
+    EXPECT_EXIT(readUnderLimit([&] {
+                  base::Stream in = stream(objectList);
+                  base::PluginFactory("objects").read(in);
+                }),
+                ::testing::ExitedWithCode(0), "")
+        << "object list, " << kind;
+  }
+}
+
+#endif
 
 // A stored bool byte other than 0 or 1 reads as true and is written back as 1.
 TEST(AttributeBinary, BoolBytesOtherThanZeroAndOneReadAsTrue) {
