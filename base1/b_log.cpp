@@ -3,9 +3,7 @@
 #include "b_platform_system.h"
 
 #include <algorithm>
-#include <cerrno>
 #include <chrono>
-#include <cstring>
 #include <ctime>
 
 #include <fmt/chrono.h>
@@ -88,14 +86,7 @@ void Log::setStderr(bool enabled) {
 
 bool Log::setFile(const std::string& path, std::string& error) {
   std::FILE* file = nullptr;
-  if (!path.empty()) {
-    file = std::fopen(path.c_str(), "a");
-    if (!file) {
-      // fopen reports through the C library's errno, whose texts the C library has.
-      error = std::strerror(errno);
-      return false;
-    }
-  }
+  if (!path.empty() && !(file = platform::openForAppending(path, error))) return false;
   std::lock_guard lock(m_mutex);
   if (m_file) std::fclose(m_file);
   m_file = file;

@@ -34,7 +34,8 @@ class BASE1_API AttribArray : public Attribute {
   /// that form.
   void write(Stream& stream, BinaryContext& context) const override;
   /// Reads the elements back; one of a type the factory does not know is skipped by its
-  /// length with a warning.
+  /// length with a warning. Maps and arrays nested deeper than BinaryContext::deepest
+  /// levels throw.
   void read(Stream& stream, BinaryContext& context) override;
   /// Index -1: the element list (Elements*); otherwise element `index`'s value.
   void* data(int index = -1) override;

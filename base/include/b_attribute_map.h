@@ -46,7 +46,8 @@ class BASE1_API AttribMap : public Attribute {
   void write(Stream& stream, BinaryContext& context) const override;
   /// Reads the members back, inserted at their places (an existing member of the same name is
   /// replaced). A member of a type the factory does not know is skipped by its length, with a
-  /// warning; reading goes on with the next one.
+  /// warning; reading goes on with the next one. Maps and arrays nested deeper than
+  /// BinaryContext::deepest levels throw.
   void read(Stream& stream, BinaryContext& context) override;
   /// Index -1: the member array (Members*); otherwise member `index`'s value.
   void* data(int index = -1) override;
@@ -100,6 +101,10 @@ class BASE1_API AttribMap : public Attribute {
   }
   /// The member `name` as stored here (no links followed, no base map asked), or null.
   const Attribute* findMember(name_id name) const { return member(name); }
+  /// The member `name` as findAttribute finds it (links followed, absent names looked up in
+  /// the base map chain) but of any type, for members that may take more than one; null
+  /// when absent or when a link does not resolve (logged as findAttribute logs it).
+  const Attribute* findResolved(name_id name) const;
   /// Destroys member `name` (as stored here; a base map keeps its own); false when absent.
   bool removeMember(name_id name);
   /// The slot that owns member `name`, or a shared slot holding null when absent. Neither

@@ -9,6 +9,7 @@
 #include "b_name.h"
 #include "b_stream.h"
 
+#include <algorithm>
 #include <bit>
 #include <cstdint>
 #include <optional>
@@ -21,8 +22,26 @@ class Attribute;
 static_assert(std::endian::native == std::endian::little, "the binary forms are written as the machine holds them");
 
 /// How the binary forms store member names, type names and references to plug-in objects.
+/// A read also counts in its context how deep it is inside maps and arrays.
 class BASE1_API BinaryContext {
  public:
+  /// The deepest nesting of maps and arrays that a read accepts, as for JSON: the reader
+  /// recurses, and a hostile input must not exhaust its stack.
+  static constexpr std::uint32_t deepest = 256;
+
+  /// One level of map or array nesting, counted in the context for as long as it lives.
+  /// Entering a level deeper than `deepest` throws base::exception, naming the stream.
+  class BASE1_API Level {
+   public:
+    Level(BinaryContext& context, Stream& stream);
+    ~Level() { --m_context.m_depth; }
+    Level(const Level&) = delete;
+    Level& operator=(const Level&) = delete;
+
+   private:
+    BinaryContext& m_context;
+  };
+
   virtual ~BinaryContext();
   /// A member name. The plain form: the text's byte length (32 bits), then its bytes.
   virtual void writeName(Stream& stream, name_id name);
@@ -35,6 +54,9 @@ class BASE1_API BinaryContext {
   /// The id under which a reference to the plug-in object listed at `index` is stored;
   /// plainly the index itself.
   virtual std::uint32_t pluginId(std::uint32_t index) const;
+
+ private:
+  std::uint32_t m_depth = 0;
 };
 
 /// A table of names stored elsewhere, each name stored as its 16-bit position in it.
@@ -66,7 +88,8 @@ class BASE1_API StringIdContext : public BinaryContext {
   NameTable types;
 };
 
-/// The plain context, for callers that need no string table.
+/// The plain context, for callers that need no string table; one per thread, since reads
+/// count their nesting in it.
 BASE1_API BinaryContext& plainContext();
 
 namespace binary {
@@ -83,6 +106,32 @@ BASE1_API std::optional<std::uint64_t> bytesLeft(Stream& stream);
 /// Reads a 32-bit count of items that take at least `itemBytes` bytes each; a count that the
 /// bytes left cannot hold throws, naming `what`.
 BASE1_API std::uint32_t readCount(Stream& stream, std::uint64_t itemBytes, std::string_view what);
+
+/// Resizes `items` to `count` and fills it through `readItems(first, n)`, which reads items
+/// first to first + n - 1 into it. Where the stream can tell how much it has left, callers
+/// have checked `count` against it and `items` is sized once. Elsewhere nothing proves the
+/// count: `items` grows by 65,536 items at a time with the data that arrives, so that a
+/// hostile count over a few bytes ends in the short-read failure, not in a huge allocation.
+template <class Items, class ReadItems>
+void readInBatches(Stream& stream, Items& items, std::uint32_t count, ReadItems&& readItems) {
+  constexpr std::uint32_t batch = 1 << 16;
+  const bool proven = bytesLeft(stream).has_value();
+  items.clear();
+  for (std::uint32_t done = 0; done < count;) {
+    const std::uint32_t n = proven ? count - done : std::min(count - done, batch);
+    items.resize(std::size_t(done) + n);
+    readItems(done, n);
+    done += n;
+  }
+}
+
+/// readInBatches for items stored as their own bytes (numbers, text).
+template <class Items>
+void readPacked(Stream& stream, Items& items, std::uint32_t count) {
+  readInBatches(stream, items, count, [&](std::uint32_t first, std::uint32_t n) {
+    read(stream, items.data() + first, std::uint64_t(n) * sizeof(*items.data()));
+  });
+}
 
 /// Writes the binary form of `attr` preceded by its byte length (32 bits), so that a reader
 /// that cannot read it can skip it.

@@ -93,8 +93,7 @@ void writeValue(Stream& stream, const T& value) {
 template <class T>
 void readValue(Stream& stream, T& value) {
   if constexpr (std::is_same_v<T, base::string>) {
-    value.resize(binary::readCount(stream, 1, "text bytes"));
-    binary::read(stream, value.data(), value.size());
+    binary::readPacked(stream, value, binary::readCount(stream, 1, "text bytes"));
   } else {
     forEachComponent(value, [&stream](auto& component) {
       if constexpr (std::is_same_v<std::remove_cvref_t<decltype(component)>, bool>) {
@@ -306,17 +305,12 @@ class TypedVectorAttribute : public Attribute {
   void read(Stream& stream, BinaryContext& context) override {
     Attribute::read(stream, context);
     const std::uint32_t count = binary::readCount(stream, detail::componentBytes<T>(), "list elements");
-    m_values.clear();
-    constexpr std::uint32_t step = 1 << 16;
-    for (std::uint32_t done = 0; done < count;) {
-      const std::uint32_t batch = binary::bytesLeft(stream) ? count - done : std::min(count - done, step);
-      m_values.resize(done + batch);
-      if constexpr (packed) {
-        binary::read(stream, m_values.data() + done, std::uint64_t(batch) * sizeof(T));
-      } else {
-        for (std::uint32_t k = 0; k < batch; ++k) detail::readValue(stream, m_values[done + k]);
-      }
-      done += batch;
+    if constexpr (packed) {
+      binary::readPacked(stream, m_values, count);
+    } else {
+      binary::readInBatches(stream, m_values, count, [&](std::uint32_t first, std::uint32_t n) {
+        for (std::uint32_t k = first; k < first + n; ++k) detail::readValue(stream, m_values[k]);
+      });
     }
   }
   /// Index -1: the list (base::vector<T>*); otherwise element `index`, or null past the end.

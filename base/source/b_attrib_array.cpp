@@ -118,6 +118,7 @@ bool AttribArray::readValue(StructuredReader& reader) {
 }
 
 void AttribArray::read(Stream& stream, BinaryContext& context) {
+  const BinaryContext::Level level(context, stream);
   Attribute::read(stream, context);
   destroyElements();
   const std::uint32_t count = binary::readCount(stream, smallestElement, "array elements");

@@ -213,6 +213,7 @@ bool AttribMap::readValue(StructuredReader& reader) {
 }
 
 void AttribMap::read(Stream& stream, BinaryContext& context) {
+  const BinaryContext::Level level(context, stream);
   Attribute::read(stream, context);
   const std::uint32_t count = binary::readCount(stream, smallestMember, "map members");
   for (std::uint32_t k = 0; k < count; ++k) {
@@ -365,26 +366,29 @@ const Attribute* AttribMap::followLinks(name_id name, const Attribute* found) co
   return target;
 }
 
-const void* AttribMap::find(name_id name, name_id type, Mismatch mismatch) const {
+const Attribute* AttribMap::findResolved(name_id name) const {
   requireName(name, "base::AttribMap::findAttribute");
-  if (const Attribute* found = member(name)) {
-    if (found->asLink() && !(found = followLinks(name, found))) return nullptr;
-    if (found->type() == type) return found->data();
-    if (mismatch == Mismatch::value) {
-      log().message(logSystem, logError,
-                    "map attribute| Detected invalid access to attribute '{}'. Expected '{}', actual attribute type - "
-                    "'{}'",
-                    text(name), text(type), text(found->type()));
-    } else {
-      log().message(logSystem, logError,
-                    "map attribute| Detected invalid access to attribute '{}'. Expected type '{}', actual attribute "
-                    "type - '{}'!",
-                    text(name), text(type), text(found->type()));
-    }
-    return nullptr;
-  }
+  if (const Attribute* found = member(name)) return found->asLink() ? followLinks(name, found) : found;
   // Inherited: the base map cannot die while its node is held.
-  return m_baseMap.visit([&](const AttribMap* base) { return base ? base->find(name, type, mismatch) : nullptr; });
+  return m_baseMap.visit([&](const AttribMap* base) { return base ? base->findResolved(name) : nullptr; });
+}
+
+const void* AttribMap::find(name_id name, name_id type, Mismatch mismatch) const {
+  const Attribute* found = findResolved(name);
+  if (!found) return nullptr;
+  if (found->type() == type) return found->data();
+  if (mismatch == Mismatch::value) {
+    log().message(logSystem, logError,
+                  "map attribute| Detected invalid access to attribute '{}'. Expected '{}', actual attribute type - "
+                  "'{}'",
+                  text(name), text(type), text(found->type()));
+  } else {
+    log().message(logSystem, logError,
+                  "map attribute| Detected invalid access to attribute '{}'. Expected type '{}', actual attribute "
+                  "type - '{}'!",
+                  text(name), text(type), text(found->type()));
+  }
+  return nullptr;
 }
 
 bool AttribMap::inheritsFrom(const AttribMap* map) const {

@@ -26,6 +26,15 @@ class ByteCounter final : public StreamWorker {
 
 }  // namespace
 
+BinaryContext::Level::Level(BinaryContext& context, Stream& stream) : m_context(context) {
+  if (context.m_depth >= deepest) {
+    raise<exception>("base::Attribute::read",
+                     fmt::format("stream '{}': the nesting of maps and arrays is deeper than {} levels",
+                                 clipped(stream.name()), deepest));
+  }
+  ++context.m_depth;
+}
+
 BinaryContext::~BinaryContext() = default;
 
 void BinaryContext::writeName(Stream& stream, name_id name) {
@@ -42,8 +51,8 @@ name_id BinaryContext::readName(Stream& stream) {
     raise<exception>("base::xdr_read", fmt::format("stream '{}': a name of {} bytes, but only {} bytes are left",
                                                    clipped(stream.name()), length, *left));
   }
-  base::string bytes(length, '\0');
-  binary::read(stream, bytes.data(), length);
+  base::string bytes;
+  binary::readPacked(stream, bytes, length);
   return intern(bytes);
 }
 
@@ -79,7 +88,7 @@ void NameTable::setNames(base::vector<name_id> names) {
 }
 
 BinaryContext& plainContext() {
-  static BinaryContext context;
+  static thread_local BinaryContext context;
   return context;
 }
 

@@ -118,8 +118,8 @@ name_id readText(Stream& stream, std::uint32_t longest, const char* function, co
   const auto length = binary::get<std::uint32_t>(stream);
   if (length > longest || (longest == longestTypeName && length == 0)) raise<exception>(function, tooLong);
   if (const auto left = binary::bytesLeft(stream); left && length > *left) binary::failShort(stream, length, *left);
-  base::string bytes(length, '\0');
-  binary::read(stream, bytes.data(), length);
+  base::string bytes;
+  binary::readPacked(stream, bytes, length);
   return intern(bytes);
 }
 

@@ -151,8 +151,10 @@ bool PluginVectorAttribute::readValue(StructuredReader& reader) {
 
 void PluginVectorAttribute::read(Stream& stream, BinaryContext& context) {
   Attribute::read(stream, context);
-  m_ids.resize(binary::readCount(stream, 4, "plug-in references"));
-  binary::read(stream, m_ids.data(), m_ids.size() * sizeof(std::uint32_t));
+  // Into a list of its own: a read that fails leaves ids and objects in step.
+  base::vector<std::uint32_t> ids;
+  binary::readPacked(stream, ids, binary::readCount(stream, 4, "plug-in references"));
+  m_ids = std::move(ids);
   m_objects.assign(m_ids.size(), ref<IPlugin>());
 }
 

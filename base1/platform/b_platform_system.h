@@ -10,6 +10,7 @@
 #include <cstdint>
 #include <cstdio>
 #include <ctime>
+#include <string>
 
 namespace base::platform {
 
@@ -36,6 +37,10 @@ base::string executablePath();
 
 /// Whether `stream` is an interactive terminal.
 bool isTerminal(std::FILE* stream);
+
+/// Opens the file at `path` (UTF-8) for appending, as a C stream that the caller closes
+/// with std::fclose; null, with the C library's reason in `error`, when it cannot.
+std::FILE* openForAppending(const std::string& path, std::string& error);
 
 /// A lock object made in `storage` (of `size` bytes): a critical section on Windows, a
 /// mutex elsewhere; entered, left and destroyed through the same storage.

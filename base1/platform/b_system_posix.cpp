@@ -77,6 +77,13 @@ base::string executablePath() {
 
 bool isTerminal(std::FILE* stream) { return ::isatty(::fileno(stream)) == 1; }
 
+std::FILE* openForAppending(const std::string& path, std::string& error) {
+  std::FILE* file = std::fopen(path.c_str(), "a");
+  // fopen reports through errno, whose texts the C library has.
+  if (!file) error = std::strerror(errno);
+  return file;
+}
+
 void createLock(void* storage, std::size_t size) {
   static_assert(alignof(std::mutex) <= 16);
   if (size < sizeof(std::mutex)) std::abort();  // the storage was sized for every system

@@ -6,6 +6,7 @@
 #include <windows.h>
 
 #include <io.h>
+#include <cerrno>
 #include <cstdio>
 #include <cstdlib>
 
@@ -79,6 +80,19 @@ base::string executablePath() {
 }
 
 bool isTerminal(std::FILE* stream) { return _isatty(_fileno(stream)) != 0; }
+
+std::FILE* openForAppending(const std::string& path, std::string& error) {
+  // The narrow fopen reads a path in the ANSI code page, which cannot name every folder:
+  // the path goes to the wide one.
+  std::FILE* file = _wfopen(wideText(path).c_str(), L"a");
+  if (!file) {
+    // _wfopen reports through errno, whose texts the C library has.
+    char text[256] = {};
+    strerror_s(text, sizeof text, errno);
+    error = text;
+  }
+  return file;
+}
 
 void createLock(void* storage, std::size_t size) {
   static_assert(alignof(CRITICAL_SECTION) <= 16);

@@ -51,7 +51,7 @@ bool hasSurface(const base::AttribMap& mesh) {
   for (std::uint32_t k = 0; primitives && k < primitives->size(); ++k) {
     const base::AttribMap* primitive = scene::mapAt(*primitives, k);
     if (primitive &&
-        scene::scalarMember<std::uint32_t>(*primitive, scene::meshPrimitive_schema::indexCount()).value_or(0) > 0) {
+        scene::valueOf<std::uint32_t>(*primitive, scene::meshPrimitive_schema::indexCount()).value_or(0) > 0) {
       return true;
     }
   }

@@ -59,13 +59,13 @@ struct ColourList {
 };
 
 ColourList colourListOf(const base::AttribMap& set) {
-  if (const auto* rgb = scene::listMember<base::base_vec3<float>>(set, meshColorSet_schema::RGB())) {
+  if (const auto* rgb = set.findVecAttribute<base::base_vec3<float>>(meshColorSet_schema::RGB())) {
     return {floatsOf(*rgb), rgb->size(), 3};
   }
-  if (const auto* rgba = scene::listMember<base::base_vec4<float>>(set, meshColorSet_schema::RGBA())) {
+  if (const auto* rgba = set.findVecAttribute<base::base_vec4<float>>(meshColorSet_schema::RGBA())) {
     return {floatsOf(*rgba), rgba->size(), 4};
   }
-  if (const auto* a = scene::listMember<float>(set, meshColorSet_schema::A())) return {a->data(), a->size(), 1};
+  if (const auto* a = set.findVecAttribute<float>(meshColorSet_schema::A())) return {a->data(), a->size(), 1};
   return {};
 }
 
@@ -88,7 +88,7 @@ std::vector<std::string> colourNames(const char* prefix, std::uint32_t channels)
 
 // The set's own index channel (per corner), or null for a set of one entry per vertex.
 const base::vector<std::uint32_t>* cornerIndices(const base::AttribMap& set) {
-  return scene::listMember<std::uint32_t>(set, meshUVSet_schema::indices());
+  return set.findVecAttribute<std::uint32_t>(meshUVSet_schema::indices());
 }
 
 // Whether the set's corner channel names an entry for some corner of [start, start + corners).
@@ -178,10 +178,10 @@ namespace {
 // normals or of its first kept vertex property (for a scene stored before kept properties
 // named their element, of the first kept list that is not a face's).
 std::uint64_t vertexCountOf(const base::AttribMap& mesh) {
-  if (const auto* positions = scene::listMember<base::base_vec3<float>>(mesh, mesh_schema::positions())) {
+  if (const auto* positions = mesh.findVecAttribute<base::base_vec3<float>>(mesh_schema::positions())) {
     return positions->size();
   }
-  if (const auto* normals = scene::listMember<base::normal>(mesh, mesh_schema::normals())) return normals->size();
+  if (const auto* normals = mesh.findVecAttribute<base::normal>(mesh_schema::normals())) return normals->size();
   const base::vector<KeptProperty> named = keptPropertiesOf(mesh);
   for (const KeptProperty& property : named) {
     if (property.primitive != KeptProperty::vertexElement) continue;
@@ -201,13 +201,13 @@ std::uint64_t vertexCountOf(const base::AttribMap& mesh) {
 void MeshLayout::addVertexElement(const ExportOptions& options) {
   m_vertexCount = vertexCountOf(m_mesh);
   WriteElement vertex{"vertex", m_vertexCount, {}};
-  if (const auto* positions = scene::listMember<base::base_vec3<float>>(m_mesh, mesh_schema::positions())) {
+  if (const auto* positions = m_mesh.findVecAttribute<base::base_vec3<float>>(mesh_schema::positions())) {
     for (std::uint32_t c = 0; c < 3; ++c) {
       vertex.properties.push_back(
           scalar(std::string(1, "xyz"[c]), DataType::float32, component(floatsOf(*positions), c), 12));
     }
   }
-  if (const auto* normals = scene::listMember<base::normal>(m_mesh, mesh_schema::normals())) {
+  if (const auto* normals = m_mesh.findVecAttribute<base::normal>(mesh_schema::normals())) {
     if (normals->size() != m_vertexCount) {
       refuse(fmt::format("the mesh has {} normals for {} vertices", normals->size(), m_vertexCount));
     }
@@ -224,7 +224,7 @@ void MeshLayout::addVertexElement(const ExportOptions& options) {
 void MeshLayout::addVertexUVSets(WriteElement& vertex) {
   std::size_t written = 0;
   for (const base::AttribMap* set : setsOf(m_mesh, mesh_schema::uvSets())) {
-    const auto* uv = scene::listMember<base::base_vec2<float>>(*set, meshUVSet_schema::UV());
+    const auto* uv = set->findVecAttribute<base::base_vec2<float>>(meshUVSet_schema::UV());
     if (!uv || cornerIndices(*set)) continue;  // per-corner sets go with their faces
     if (written == std::size(uvNames)) {
       refuse("a PLY vertex holds at most three UV sets (u v, s t, tx ty); this mesh has more");
@@ -263,10 +263,9 @@ void MeshLayout::addVertexColourSets(WriteElement& vertex) {
 }
 
 void MeshLayout::addPrimitive(const base::AttribMap& primitive, std::uint32_t index, const ExportOptions& options) {
-  const std::uint32_t start =
-      scene::scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexStart()).value_or(0);
+  const std::uint32_t start = scene::valueOf<std::uint32_t>(primitive, meshPrimitive_schema::indexStart()).value_or(0);
   const std::uint32_t corners =
-      scene::scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexCount()).value_or(0);
+      scene::valueOf<std::uint32_t>(primitive, meshPrimitive_schema::indexCount()).value_or(0);
   if (std::uint64_t(start) + corners > m_indices.size()) {
     refuse(fmt::format("a primitive names indices {} to {} of {}", start, std::uint64_t(start) + corners,
                        m_indices.size()));
@@ -274,7 +273,11 @@ void MeshLayout::addPrimitive(const base::AttribMap& primitive, std::uint32_t in
   if (corners == 0) return;  // points: the vertices say it all
   WriteProperty indices = scalar("vertex_indices", DataType::int32, m_indices.data() + start, 4);
   indices.isList = true;
-  if (const auto* strips = scene::listMember<std::uint32_t>(primitive, meshPrimitive_schema::ecounts())) {
+  if (const auto* strips = primitive.findVecAttribute<std::uint32_t>(meshPrimitive_schema::ecounts())) {
+    // The writer takes each strip's indices in turn: together they must lie in the range.
+    std::uint64_t total = 0;
+    for (const std::uint32_t n : *strips) total += n;
+    if (total > corners) refuse(fmt::format("a primitive's strips have {} indices, its range {}", total, corners));
     indices.counts = strips->data();
     indices.countType = countTypeFor(strips->empty() ? 0 : *std::max_element(strips->begin(), strips->end()));
     m_elements.push_back(WriteElement{"tristrips", strips->size(), {indices}});
@@ -333,7 +336,7 @@ void MeshLayout::addFaceElement(const base::AttribMap& primitive, std::uint32_t 
 // Each face's corners' coordinates, u and v in turn, as the face's "texcoord" list.
 void MeshLayout::addFaceUVs(WriteElement& face, const base::AttribMap& set, std::uint32_t start,
                             const WriteProperty& faces) {
-  const auto* uv = scene::listMember<base::base_vec2<float>>(set, meshUVSet_schema::UV());
+  const auto* uv = set.findVecAttribute<base::base_vec2<float>>(meshUVSet_schema::UV());
   const base::vector<std::uint32_t>& channel = *cornerIndices(set);
   std::vector<float> coordinates;
   std::uint64_t corner = start;
@@ -475,7 +478,7 @@ void MeshLayout::addUnnamedKeptList(std::string_view member, WriteProperty prope
 void MeshLayout::addMaterials() {
   std::vector<const base::IPlugin*> materials;
   for (const base::AttribMap* primitive : setsOf(m_mesh, mesh_schema::primitives())) {
-    const auto* named = scene::listMember<base::ref<base::IPlugin>>(*primitive, meshPrimitive_schema::materials());
+    const auto* named = primitive->findVecAttribute<base::ref<base::IPlugin>>(meshPrimitive_schema::materials());
     for (const base::ref<base::IPlugin>& material : named ? *named : base::vector<base::ref<base::IPlugin>>{}) {
       if (material && material->mapType() == scene::principalMaterial_schema::typeName() &&
           std::find(materials.begin(), materials.end(), material.get()) == materials.end()) {

@@ -34,7 +34,7 @@ template <class T>
 void concatenate(base::AttribMap& target, base::name_id name, const std::vector<const base::AttribMap*>& maps) {
   base::vector<T> joined;
   for (const base::AttribMap* map : maps) {
-    const base::vector<T>* list = scene::listMember<T>(*map, name);
+    const base::vector<T>* list = map->findVecAttribute<T>(name);
     if (!list) refuse(fmt::format("'{}' is not in every one", base::text(name)));
     joined.insert(joined.end(), list->begin(), list->end());
   }
@@ -44,7 +44,7 @@ void concatenate(base::AttribMap& target, base::name_id name, const std::vector<
 // A list member of the same name and type in every map, joined; absent from all, left out.
 template <class T>
 void concatenateWhereAll(base::AttribMap& target, base::name_id name, const std::vector<const base::AttribMap*>& maps) {
-  if (scene::listMember<T>(*maps.front(), name)) concatenate<T>(target, name, maps);
+  if (maps.front()->findVecAttribute<T>(name)) concatenate<T>(target, name, maps);
 }
 
 // The k-th set of every mesh, as a list of maps; every mesh must have as many sets.
@@ -89,7 +89,7 @@ void mergeKept(base::AttribMap& merged, const std::vector<const base::AttribMap*
   }
   for (const auto& [name, member] : meshes.front()->members()) {
     if (!base::text(name).starts_with("ply:")) continue;
-    const auto* positions = scene::listMember<base::base_vec3<float>>(*meshes.front(), mesh_schema::positions());
+    const auto* positions = meshes.front()->findVecAttribute<base::base_vec3<float>>(mesh_schema::positions());
     if (!positions || member->size() != positions->size()) {
       refuse(fmt::format("{} is no per-vertex list", base::text(name)));
     }
@@ -115,11 +115,11 @@ void mergePrimitives(base::AttribMap& merged, const std::vector<const base::Attr
       if (!primitive) continue;
       auto* copy = static_cast<base::AttribMap*>(primitive->clone());
       const std::uint32_t start =
-          scene::scalarMember<std::uint32_t>(*primitive, meshPrimitive_schema::indexStart()).value_or(0);
+          scene::valueOf<std::uint32_t>(*primitive, meshPrimitive_schema::indexStart()).value_or(0);
       copy->attribute<std::uint32_t>(meshPrimitive_schema::indexStart(), start + indexBase);
       primitives.append(copy);
     }
-    const auto* positions = scene::listMember<base::base_vec3<float>>(*mesh, mesh_schema::positions());
+    const auto* positions = mesh->findVecAttribute<base::base_vec3<float>>(mesh_schema::positions());
     vertexBase += positions ? static_cast<std::uint32_t>(positions->size()) : 0;
   }
   merged.attribute<base::vector<std::uint32_t>>(mesh_schema::indices(), indices);

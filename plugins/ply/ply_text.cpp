@@ -1,7 +1,8 @@
 #include "ply_text.h"
 
+#include "ply_real_scan.h"
+
 #include <algorithm>
-#include <bit>
 #include <charconv>
 #include <cstring>
 #include <limits>
@@ -48,60 +49,10 @@ bool tooLarge(std::string_view number) {
   return magnitude > 0;
 }
 
-// The common forms, [sign] digits [. digits] [e|E [sign] digits] filling the whole word, with
-// a mantissa below 2^53 and a power of ten up to 22: the mantissa and the power are exact
-// doubles, so one multiplication or division gives the correctly rounded double. For a
-// double that is the answer; a float is rounded from it, which is right unless the double
-// lies exactly halfway between two floats. False leaves the word to from_chars.
-template <class T>
-const char* scanRealFast(const char* at, const char* const end, T& result) {
-  static constexpr double powers[] = {1e0,  1e1,  1e2,  1e3,  1e4,  1e5,  1e6,  1e7,  1e8,  1e9,  1e10, 1e11,
-                                      1e12, 1e13, 1e14, 1e15, 1e16, 1e17, 1e18, 1e19, 1e20, 1e21, 1e22};
-  constexpr std::uint64_t mantissaLimit = (std::uint64_t(1) << 53) / 10 - 1;
-  const bool negative = at != end && *at == '-';
-  if (at != end && (*at == '-' || *at == '+')) ++at;
-  std::uint64_t mantissa = 0;
-  int exponent = 0;
-  bool digits = false;
-  for (; at != end && *at >= '0' && *at <= '9'; ++at, digits = true) {
-    if (mantissa > mantissaLimit) return nullptr;
-    mantissa = mantissa * 10 + static_cast<std::uint64_t>(*at - '0');
-  }
-  if (at != end && *at == '.') {
-    for (++at; at != end && *at >= '0' && *at <= '9'; ++at, digits = true, --exponent) {
-      if (mantissa > mantissaLimit) return nullptr;
-      mantissa = mantissa * 10 + static_cast<std::uint64_t>(*at - '0');
-    }
-  }
-  if (!digits) return nullptr;
-  if (at != end && (*at == 'e' || *at == 'E')) {
-    ++at;
-    const bool negativeExponent = at != end && *at == '-';
-    if (at != end && (*at == '-' || *at == '+')) ++at;
-    if (at == end) return nullptr;
-    int value = 0;
-    for (; at != end && *at >= '0' && *at <= '9' && value < 1000; ++at) value = value * 10 + (*at - '0');
-    exponent += negativeExponent ? -value : value;
-  }
-  if (exponent < -22 || exponent > 22) return nullptr;
-  double magnitude = static_cast<double>(mantissa);
-  magnitude = exponent < 0 ? magnitude / powers[-exponent] : magnitude * powers[exponent];
-  if constexpr (std::is_same_v<T, float>) {
-    // The magnitude lies in the normal float range (1e-22 to 9e37), where a double halfway
-    // between two floats has exactly the 29 bits below float precision at 1000...0.
-    if ((std::bit_cast<std::uint64_t>(magnitude) & 0x1FFFFFFFu) == 0x10000000u) return nullptr;
-    const auto nearest = static_cast<float>(magnitude);
-    result = negative ? -nearest : nearest;
-  } else {
-    result = negative ? -magnitude : magnitude;
-  }
-  return at;
-}
-
 // The forms of scanRealFast that fill the whole word.
 template <class T>
 bool parseRealFast(std::string_view word, T& result) {
-  return scanRealFast(word.data(), word.data() + word.size(), result) == word.data() + word.size();
+  return detail::scanRealFast(word.data(), word.data() + word.size(), result) == word.data() + word.size();
 }
 
 // An optional sign (only '+' for unsigned types) and decimal digits, wrapping at 32 bits.
@@ -197,7 +148,7 @@ template <DataType T>
 const char* parseAsciiFast(const char* at, const char* end, detail::Held<T>& value) {
   const char* stop = nullptr;
   if constexpr (std::is_floating_point_v<detail::Held<T>>) {
-    stop = scanRealFast(at, end, value);
+    stop = detail::scanRealFast(at, end, value);
   } else {
     stop = scanIntegerFast(at, end, value);
   }

@@ -51,14 +51,11 @@ class SceneFactory : public base::PluginFactory {
 
  private:
   /// A temporary object of the first plug-in, in priority order, that lists `extension`;
-  /// null when none makes one. `index` receives the index it was made with.
-  base::ref<base::IPlugin> createFor(std::string_view extension, bool importers, std::uint32_t& index);
+  /// null when none makes one. It is not listed: it goes with its last reference.
+  base::ref<base::IPlugin> createFor(std::string_view extension, bool importers);
   /// The extension loop of the import side: the extension after the second-to-last dot,
   /// then after the last one. A path without one throws `emptyMessage`.
-  base::ref<base::IPlugin> createImporter(std::string_view path, const char* function, std::string_view emptyMessage,
-                                          std::uint32_t& index);
-  /// Drops a temporary object's (never used) slot and the empty slots at the list's end.
-  void discard(std::uint32_t index);
+  base::ref<base::IPlugin> createImporter(std::string_view path, const char* function, std::string_view emptyMessage);
   void loadLibrary(const base::string& file);
 
   base::vector<base::ref<IScenePluginDesc>> m_scenePlugins;

@@ -18,8 +18,9 @@ namespace scene {
 /// are links or differ in length.
 ///
 /// A primitive is left as it is without `vcounts` (strips), with a `vcounts` list holding a
-/// count below 3, or with a single count outside 2 to 4; a range beyond the channels is cut
-/// to them, and faces that the range does not hold whole are left out.
+/// count below 3 or reached through a link (which others may share), or with a single count
+/// outside 2 to 4; a range beyond the channels is cut to them, and faces that the range does
+/// not hold whole are left out. Ranges and counts are read with links followed.
 bool encodeIndexDeltas(base::AttribMap& mesh, std::span<base::vector<std::uint32_t>* const> companions = {});
 
 /// Encodes one primitive's range: `channels` point at the range's first index in each
@@ -33,8 +34,9 @@ void encodeRangeDeltas(std::span<std::uint32_t* const> channels, std::uint32_t c
 /// encodeIndexDeltas encodes. False, unchanged, for a mesh that is not marked.
 bool decodeIndexDeltas(base::AttribMap& mesh);
 
-/// The mesh's `indices` as plain indices: decoded when the mesh is marked, as stored
-/// otherwise (empty without indices). The mesh is not changed.
+/// The mesh's `indices` (links followed) as plain indices: decoded when the mesh is marked
+/// and the list is its own, as stored otherwise (empty without indices). The mesh is not
+/// changed.
 base::vector<std::uint32_t> decodedIndices(const base::AttribMap& mesh);
 
 /// Reverses the difference pass of encodeRangeDeltas on one range of the first channel.

@@ -26,11 +26,26 @@ base::AttribMap* mapAt(const base::AttribArray& array, std::uint32_t index);
 struct FaceCounts {
   std::optional<std::uint16_t> uniform;
   const base::vector<std::uint16_t>* perFace = nullptr;
+  /// Whether the counts are the primitive's own member rather than reached through a link:
+  /// only its own list may be changed in place.
+  bool own = false;
 
   bool present() const { return uniform || perFace; }
 };
-/// The `vcounts` of a primitive in either form (none when absent or of another type).
+/// The `vcounts` of a primitive in either form, links followed; none when absent or of
+/// another type (logged as the map's typed lookups log it).
 FaceCounts faceCountsOf(const base::AttribMap& primitive);
+
+/// Member `name` of `map` through the map's typed lookup (links followed, a member of
+/// another type logged); none when it is absent or of another type.
+template <class T>
+std::optional<T> valueOf(const base::AttribMap& map, base::name_id name) {
+  const T* value = map.findAttribute<T>(name);
+  return value ? std::optional<T>(*value) : std::nullopt;
+}
+
+// The stored-member reads below see only what `map` itself holds: for data that a caller
+// changes in place, or lays out as it is stored. Readers use the typed lookups.
 
 /// Member `name` of `map` as stored there (no links followed, no base map asked) when it is
 /// a T; none when it is absent or of another type.

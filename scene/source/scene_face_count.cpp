@@ -27,16 +27,16 @@ std::uint32_t countStrips(const base::AttribMap& primitive, std::optional<std::u
                           const base::vector<std::uint32_t>* source) {
   const bool lines = topology == lineStripTopology;
   std::uint32_t total = 0;
-  if (const auto* ecounts = listMember<std::uint32_t>(primitive, meshPrimitive_schema::ecounts())) {
+  if (const auto* ecounts = primitive.findVecAttribute<std::uint32_t>(meshPrimitive_schema::ecounts())) {
     for (const std::uint32_t length : *ecounts) total += stripElements(length, lines);
     return total;
   }
   if (!source || (topology != 4 && topology != lineStripTopology)) return 0;
   const std::uint32_t size = static_cast<std::uint32_t>(source->size());
   const std::uint32_t start =
-      std::min(scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexStart()).value_or(0), size);
+      std::min(valueOf<std::uint32_t>(primitive, meshPrimitive_schema::indexStart()).value_or(0), size);
   const std::uint32_t count =
-      std::min(scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexCount()).value_or(size), size - start);
+      std::min(valueOf<std::uint32_t>(primitive, meshPrimitive_schema::indexCount()).value_or(size), size - start);
   std::uint32_t run = 0;
   for (std::uint32_t i = start; i < start + count; ++i) {
     if ((*source)[i] == restartMarker) {
@@ -66,12 +66,13 @@ std::uint32_t coveredIndices(const base::AttribMap& mesh, std::optional<std::uin
 
 std::uint32_t countFaces(const base::AttribMap& mesh, std::uint32_t flags) {
   const bool triangles = flags & countTriangles;
-  const base::vector<std::uint32_t>* triIndices =
-      triangles && !(flags & ignoreTriIndices) ? listMember<std::uint32_t>(mesh, mesh_schema::triIndices()) : nullptr;
+  const base::vector<std::uint32_t>* triIndices = triangles && !(flags & ignoreTriIndices)
+                                                      ? mesh.findVecAttribute<std::uint32_t>(mesh_schema::triIndices())
+                                                      : nullptr;
   const bool triangleMode = triIndices != nullptr;
   const base::vector<std::uint32_t>* source = triIndices;
-  if (!source) source = listMember<std::uint32_t>(mesh, mesh_schema::indices());
-  if (!source) source = listMember<std::uint32_t>(mesh, mesh_schema::positionIndices());
+  if (!source) source = mesh.findVecAttribute<std::uint32_t>(mesh_schema::indices());
+  if (!source) source = mesh.findVecAttribute<std::uint32_t>(mesh_schema::positionIndices());
 
   const base::AttribArray* primitives = findArrayMember(mesh, mesh_schema::primitives());
   std::uint32_t total = 0;
@@ -81,13 +82,13 @@ std::uint32_t countFaces(const base::AttribMap& mesh, std::uint32_t flags) {
       base::log().message(base::logScene, base::logDebug, "mesh |{}| Invalid primitive detected!", meshName(mesh));
       continue;
     }
-    const auto topology = scalarMember<std::uint8_t>(*primitive, meshPrimitive_schema::topology());
+    const auto topology = valueOf<std::uint8_t>(*primitive, meshPrimitive_schema::topology());
     const FaceCounts counts = faceCountsOf(*primitive);
     if (counts.uniform && *counts.uniform < 3) continue;
     if ((topology && *topology > 2) || (!topology && !counts.present())) {
       total += countStrips(*primitive, topology, source);
     } else if (triangleMode) {
-      const auto own = scalarMember<std::uint32_t>(*primitive, meshPrimitive_schema::triIndexCount());
+      const auto own = valueOf<std::uint32_t>(*primitive, meshPrimitive_schema::triIndexCount());
       total += coveredIndices(mesh, own, topology, source) / 3;
     } else if (counts.perFace) {
       for (const std::uint16_t n : *counts.perFace) {
@@ -95,7 +96,7 @@ std::uint32_t countFaces(const base::AttribMap& mesh, std::uint32_t flags) {
       }
     } else if (counts.uniform) {
       const std::uint32_t v = *counts.uniform;
-      const auto own = scalarMember<std::uint32_t>(*primitive, meshPrimitive_schema::indexCount());
+      const auto own = valueOf<std::uint32_t>(*primitive, meshPrimitive_schema::indexCount());
       const std::uint32_t n = coveredIndices(mesh, own, topology, source);
       total += triangles ? (n / v) * (v - 2) : n / v;
     }

@@ -181,57 +181,46 @@ base::string SceneFactory::libraryOf(const base::IPluginDesc* descriptor) const 
   return found == m_libraryOf.end() ? base::string() : found->second;
 }
 
-base::ref<base::IPlugin> SceneFactory::createFor(std::string_view extension, bool importers, std::uint32_t& index) {
+base::ref<base::IPlugin> SceneFactory::createFor(std::string_view extension, bool importers) {
   for (const base::ref<IScenePluginDesc>& descriptor : m_scenePlugins) {
     if (!matchesExtension(extension, extensionsOf(*descriptor, importers))) continue;
-    index = static_cast<std::uint32_t>(objects().size());
-    base::ref<base::IPlugin> object(descriptor->create(this, index));
+    base::ref<base::IPlugin> object(descriptor->create(this, base::IPlugin::unlisted));
     if (object) return object;
   }
   return nullptr;
 }
 
 base::ref<base::IPlugin> SceneFactory::createImporter(std::string_view path, const char* function,
-                                                      std::string_view emptyMessage, std::uint32_t& index) {
+                                                      std::string_view emptyMessage) {
   base::string previous;
   for (const bool second : {true, false}) {
     const base::string extension = base::asciiLower(base::getExtension(path, second));
     if (extension.empty()) base::raise<base::exception>(function, emptyMessage);
     if (extension == previous) return nullptr;
-    if (base::ref<base::IPlugin> object = createFor(extension, true, index)) return object;
+    if (base::ref<base::IPlugin> object = createFor(extension, true)) return object;
     previous = extension;
   }
   return nullptr;
 }
 
-void SceneFactory::discard(std::uint32_t index) {
-  remove(index, false);
-  compact();
-}
-
 bool SceneFactory::getImporterParameters(std::string_view path, base::AttribMap& parameters) {
   const bool exists = base::fs::master().fileExists(path);
-  std::uint32_t index = 0;
-  const base::ref<base::IPlugin> object =
-      createImporter(path, "scene::SceneFactory::getImporterParameters",
-                     "mesh factory: Can't load meshes without an extension!", index);
+  const base::ref<base::IPlugin> object = createImporter(path, "scene::SceneFactory::getImporterParameters",
+                                                         "mesh factory: Can't load meshes without an extension!");
   if (!object) return false;
   if (ISceneImporter* importer = importerOf(*object)) {
     if (!exists || importer->canImport(path)) importer->getParameters(parameters);
   }
-  discard(index);
   return true;
 }
 
 bool SceneFactory::getPluginParameters(IScenePluginDesc& descriptor, bool importers, base::AttribMap& parameters) {
-  const auto index = static_cast<std::uint32_t>(objects().size());
-  const base::ref<base::IPlugin> object(descriptor.create(this, index));
+  const base::ref<base::IPlugin> object(descriptor.create(this, base::IPlugin::unlisted));
   if (!object) return false;
   ISceneImporter* importer = importers ? importerOf(*object) : nullptr;
   ISceneExporter* exporter = importers ? nullptr : exporterOf(*object);
   if (importer) importer->getParameters(parameters);
   if (exporter) exporter->getParameters(parameters);
-  discard(index);
   return importer || exporter;
 }
 
@@ -251,10 +240,8 @@ bool SceneFactory::getExporterParameters(std::string_view path, base::AttribMap&
 }
 
 bool SceneFactory::load(base::PluginFactory& scene, std::string_view path, const base::AttribMap& parameters) {
-  std::uint32_t index = 0;
-  const base::ref<base::IPlugin> object =
-      createImporter(path, "scene::SceneFactory::load",
-                     fmt::format("mesh factory|{}| Can't load meshes without an extension!", path), index);
+  const base::ref<base::IPlugin> object = createImporter(
+      path, "scene::SceneFactory::load", fmt::format("mesh factory|{}| Can't load meshes without an extension!", path));
   if (!object) return false;
   ISceneImporter* importer = importerOf(*object);
   if (!importer || !importer->canImport(path)) return false;
@@ -268,16 +255,11 @@ bool SceneFactory::save(base::PluginFactory& scene, std::string_view path, const
     base::raise<base::exception>("scene::SceneFactory::save",
                                  "mesh factory: Can't save meshes without a provided format!");
   }
-  std::uint32_t index = 0;
-  const base::ref<base::IPlugin> object = createFor(extension, false, index);
-  if (!object) return false;
-  bool saved = false;
-  if (ISceneExporter* exporter = exporterOf(*object)) {
-    object->copyFrom(parameters, base::copyOverwrite);
-    saved = exporter->exportScene(scene, path);
-  }
-  discard(index);
-  return saved;
+  const base::ref<base::IPlugin> object = createFor(extension, false);
+  ISceneExporter* exporter = object ? exporterOf(*object) : nullptr;
+  if (!exporter) return false;
+  object->copyFrom(parameters, base::copyOverwrite);
+  return exporter->exportScene(scene, path);
 }
 
 base::string SceneFactory::getSupportedExtensions(bool importers) const {

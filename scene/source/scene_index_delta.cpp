@@ -43,7 +43,8 @@ void rotateUniform(std::span<std::uint32_t* const> channels, std::uint32_t count
   for (std::uint32_t offset = 0; offset + N <= count; offset += N) {
     const std::uint32_t start = startCorner(channels[0] + offset, N);
     if (start == 0) continue;
-    for (std::uint32_t* channel : channels) std::rotate(channel + offset, channel + offset + start, channel + offset + N);
+    for (std::uint32_t* channel : channels)
+      std::rotate(channel + offset, channel + offset + start, channel + offset + N);
   }
 }
 
@@ -156,15 +157,17 @@ void forEachEncodableRange(const base::AttribMap& mesh, std::uint32_t length, Ra
     const base::AttribMap* primitive = mapAt(*primitives, i);
     if (!primitive) continue;
     const FaceCounts counts = faceCountsOf(*primitive);
+    // Sorting rewrites a count list: one reached through a link may be shared.
+    if (counts.perFace && !counts.own) continue;
     if (counts.uniform && (*counts.uniform < 2 || *counts.uniform > 4)) continue;
     if (counts.perFace && std::any_of(counts.perFace->begin(), counts.perFace->end(), [](auto n) { return n < 3; })) {
       continue;
     }
     if (!counts.present()) continue;
-    const std::uint32_t start = scalarMember<std::uint32_t>(*primitive, meshPrimitive_schema::indexStart()).value_or(0);
+    const std::uint32_t start = valueOf<std::uint32_t>(*primitive, meshPrimitive_schema::indexStart()).value_or(0);
     if (start >= length) continue;
     std::uint32_t count = std::min(
-        scalarMember<std::uint32_t>(*primitive, meshPrimitive_schema::indexCount()).value_or(length), length - start);
+        valueOf<std::uint32_t>(*primitive, meshPrimitive_schema::indexCount()).value_or(length), length - start);
     std::span<std::uint16_t> faceCounts;
     if (counts.perFace) {
       auto* list = const_cast<base::vector<std::uint16_t>*>(counts.perFace);
@@ -239,10 +242,11 @@ bool decodeIndexDeltas(base::AttribMap& mesh) {
 }
 
 base::vector<std::uint32_t> decodedIndices(const base::AttribMap& mesh) {
-  const base::vector<std::uint32_t>* stored = listMember<std::uint32_t>(mesh, mesh_schema::indices());
+  const base::vector<std::uint32_t>* stored = mesh.findVecAttribute<std::uint32_t>(mesh_schema::indices());
   if (!stored) return {};
   base::vector<std::uint32_t> plain = *stored;
-  if (!marked(mesh)) return plain;
+  // Only the mesh's own list is ever encoded: one reached through a link holds plain indices.
+  if (!marked(mesh) || stored != listMember<std::uint32_t>(mesh, mesh_schema::indices())) return plain;
   forEachEncodableRange(
       mesh, static_cast<std::uint32_t>(plain.size()),
       [&](std::uint32_t start, std::uint32_t count, std::span<std::uint16_t> faceCounts, std::uint32_t uniformCount) {

@@ -1,5 +1,6 @@
 #include "scene_mesh.h"
 
+#include "b_log.h"
 #include "scene_schema.h"
 
 namespace scene {
@@ -27,9 +28,25 @@ base::AttribMap* mapAt(const base::AttribArray& array, std::uint32_t index) {
 }
 
 FaceCounts faceCountsOf(const base::AttribMap& primitive) {
+  using Traits = base::TypeTraits<std::uint16_t>;
+  const base::name_id name = meshPrimitive_schema::vcounts();
   FaceCounts counts;
-  counts.uniform = scalarMember<std::uint16_t>(primitive, meshPrimitive_schema::vcounts());
-  counts.perFace = listMember<std::uint16_t>(primitive, meshPrimitive_schema::vcounts());
+  // Either form is right, so the member is resolved without a type and then taken as it is.
+  const base::Attribute* found = primitive.findResolved(name);
+  if (!found) return counts;
+  if (found->type() == Traits::n_name) {
+    counts.uniform = *static_cast<const std::uint16_t*>(found->data());
+  } else if (found->type() == Traits::n_array_name) {
+    counts.perFace = static_cast<const base::vector<std::uint16_t>*>(found->data());
+  } else {
+    base::log().message(base::logSystem, base::logError,
+                        "map attribute| Detected invalid access to attribute '{}'. Expected type '{}' or '{}', actual "
+                        "attribute type - '{}'!",
+                        base::text(name), base::text(Traits::n_name), base::text(Traits::n_array_name),
+                        base::text(found->type()));
+    return counts;
+  }
+  counts.own = found == primitive.findMember(name);
   return counts;
 }
 

@@ -73,24 +73,22 @@ bool checkVectors(const base::vector<V>& vectors, std::string_view mesh, const V
 
 template <class V>
 bool checkOptional(const base::AttribMap& map, base::name_id name, std::string_view mesh, const VectorCheck& check) {
-  const base::vector<V>* vectors = listMember<V>(map, name);
+  const base::vector<V>* vectors = map.findVecAttribute<V>(name);
   return !vectors || checkVectors(*vectors, mesh, check);
 }
 
 // A set with an index channel of its own (face-varying data) holds as many entries as its
 // channel needs: the channel runs in step with the mesh's indices, and each of its values
 // names an entry or is the set's invalid index.
-bool checkSetChannel(const base::AttribMap& set, std::size_t entries, std::size_t corners, std::string_view mesh,
-                     std::string_view label) {
-  const base::vector<std::uint32_t>* channel = listMember<std::uint32_t>(set, meshUVSet_schema::indices());
+bool checkSetChannel(const base::AttribMap& set, const base::vector<std::uint32_t>* channel, std::size_t entries,
+                     std::size_t corners, std::string_view mesh, std::string_view label) {
   if (!channel) return true;
   if (channel->size() != corners) {
     base::log().message(logScene, logError, "validate |{}| The {} index channel and indices count doesn't match!", mesh,
                         label);
     return false;
   }
-  const std::uint32_t invalid =
-      scalarMember<std::uint32_t>(set, meshUVSet_schema::invalidIndex()).value_or(0xFFFFFFFFu);
+  const std::uint32_t invalid = valueOf<std::uint32_t>(set, meshUVSet_schema::invalidIndex()).value_or(0xFFFFFFFFu);
   const auto bad = std::find_if(channel->begin(), channel->end(),
                                 [&](std::uint32_t value) { return value != invalid && value >= entries; });
   if (bad == channel->end()) return true;
@@ -99,21 +97,17 @@ bool checkSetChannel(const base::AttribMap& set, std::size_t entries, std::size_
   return false;
 }
 
-// Whether the set has an index channel of its own: its lists then need not match the vertices.
-bool hasOwnChannel(const base::AttribMap& set) {
-  return listMember<std::uint32_t>(set, meshUVSet_schema::indices()) != nullptr;
-}
-
 // The entries of a set: the longest of its layouts.
 template <class One, class Three, class Four>
 std::size_t entriesOf(const base::AttribMap& set, base::name_id one, base::name_id three, base::name_id four) {
   const auto sizeOf = [](const auto* list) -> std::size_t { return list ? list->size() : 0; };
-  return std::max(
-      {sizeOf(listMember<One>(set, one)), sizeOf(listMember<Three>(set, three)), sizeOf(listMember<Four>(set, four))});
+  return std::max({sizeOf(set.findVecAttribute<One>(one)), sizeOf(set.findVecAttribute<Three>(three)),
+                   sizeOf(set.findVecAttribute<Four>(four))});
 }
 
-// The vertex data: positions, normals, tangents, velocities, colour and UV sets.
-bool checkVertexData(const base::AttribMap& mesh, std::string_view name, std::size_t vertices) {
+// The vertex data: positions, normals, tangents, velocities, colour and UV sets. A set with
+// an index channel of its own need not match the vertices.
+bool checkVertexData(const base::AttribMap& mesh, std::string_view name, std::size_t vertices, std::size_t corners) {
   bool valid = true;
   using Vec2 = base::base_vec2<float>;
   using Vec3 = base::base_vec3<float>;
@@ -121,16 +115,15 @@ bool checkVertexData(const base::AttribMap& mesh, std::string_view name, std::si
   valid &= checkOptional<base::normal>(mesh, mesh_schema::normals(), name, {"normals", vertices, true, true});
   valid &= checkOptional<Vec3>(mesh, mesh_schema::tangents(), name, {"tangents", vertices, true, true});
   valid &= checkOptional<Vec3>(mesh, mesh_schema::velocities(), name, {"velocities", vertices});
-  const base::vector<std::uint32_t>* indices = listMember<std::uint32_t>(mesh, mesh_schema::indices());
-  const std::size_t corners = indices ? indices->size() : 0;
   const base::AttribArray* colours = findArrayMember(mesh, mesh_schema::colorSets());
   for (std::uint32_t i = 0; colours && i < colours->size(); ++i) {
     const base::AttribMap* set = mapAt(*colours, i);
     if (!set) continue;
-    const std::size_t expected = hasOwnChannel(*set) ? 0 : vertices;
+    const auto* channel = set->findVecAttribute<std::uint32_t>(meshColorSet_schema::indices());
+    const std::size_t expected = channel ? 0 : vertices;
     valid &= checkOptional<Vec3>(*set, meshColorSet_schema::RGB(), name, {"rgb colors", expected});
     valid &= checkOptional<Vec4>(*set, meshColorSet_schema::RGBA(), name, {"rgba colors", expected});
-    valid &= checkSetChannel(*set,
+    valid &= checkSetChannel(*set, channel,
                              entriesOf<float, Vec3, Vec4>(*set, meshColorSet_schema::A(), meshColorSet_schema::RGB(),
                                                           meshColorSet_schema::RGBA()),
                              corners, name, "color");
@@ -139,12 +132,13 @@ bool checkVertexData(const base::AttribMap& mesh, std::string_view name, std::si
   for (std::uint32_t i = 0; uvs && i < uvs->size(); ++i) {
     const base::AttribMap* set = mapAt(*uvs, i);
     if (!set) continue;
-    const std::size_t expected = hasOwnChannel(*set) ? 0 : vertices;
+    const auto* channel = set->findVecAttribute<std::uint32_t>(meshUVSet_schema::indices());
+    const std::size_t expected = channel ? 0 : vertices;
     valid &= checkOptional<Vec2>(*set, meshUVSet_schema::UV(), name, {"uv coordinates", expected});
     valid &= checkOptional<Vec3>(*set, meshUVSet_schema::UVW(), name, {"uvw coordinates", expected});
     valid &= checkOptional<Vec4>(*set, meshUVSet_schema::UVWQ(), name, {"uvwq coordinates", expected});
     valid &= checkSetChannel(
-        *set,
+        *set, channel,
         entriesOf<Vec2, Vec3, Vec4>(*set, meshUVSet_schema::UV(), meshUVSet_schema::UVW(), meshUVSet_schema::UVWQ()),
         corners, name, "uv");
   }
@@ -158,8 +152,8 @@ std::optional<std::pair<std::uint32_t, std::uint32_t>> checkRange(const base::At
                                                                   std::size_t listSize, std::size_t primitives,
                                                                   std::string_view mesh, const char* missingStart,
                                                                   const char* missingCount) {
-  const std::optional<std::uint32_t> start = scalarMember<std::uint32_t>(primitive, startName);
-  const std::optional<std::uint32_t> count = scalarMember<std::uint32_t>(primitive, countName);
+  const std::optional<std::uint32_t> start = valueOf<std::uint32_t>(primitive, startName);
+  const std::optional<std::uint32_t> count = valueOf<std::uint32_t>(primitive, countName);
   if (!start && primitives >= 2) base::log().message(logScene, logError, "validate |{}| {}", mesh, missingStart);
   if (!count && primitives >= 2) base::log().message(logScene, logError, "validate |{}| {}", mesh, missingCount);
   if (!start || !count) return std::nullopt;
@@ -176,7 +170,7 @@ std::optional<std::pair<std::uint32_t, std::uint32_t>> checkRange(const base::At
 void checkFaceCounts(const base::AttribMap& primitive, std::optional<std::uint32_t> rangeCount,
                      const base::vector<std::uint32_t>* indices, std::string_view mesh) {
   const FaceCounts counts = faceCountsOf(primitive);
-  const auto* ecounts = listMember<std::uint32_t>(primitive, meshPrimitive_schema::ecounts());
+  const auto* ecounts = primitive.findVecAttribute<std::uint32_t>(meshPrimitive_schema::ecounts());
   if (!counts.present() && !ecounts) {
     base::log().message(logScene, logWarning, "validate |{}| Found primitive from unknown type!!", mesh);
     return;
@@ -213,7 +207,7 @@ void checkIndexValues(const base::vector<std::uint32_t>& values, std::size_t lim
 
 bool validateMesh(const base::AttribMap& mesh) {
   const std::string_view name = nameOf(mesh);
-  const auto* positions = listMember<base::base_vec3<float>>(mesh, mesh_schema::positions());
+  const auto* positions = mesh.findVecAttribute<base::base_vec3<float>>(mesh_schema::positions());
   if (!positions) {
     base::log().message(logScene, logError, "validate |{}| The vertex positions are missing!", name);
   } else {
@@ -221,14 +215,13 @@ bool validateMesh(const base::AttribMap& mesh) {
   }
   // Without positions the other per-vertex lists have nothing to agree with.
   const std::size_t vertices = positions ? positions->size() : 0;
-  bool valid = checkVertexData(mesh, name, vertices);
-
   // Range checks look at vertex indices, never at the differences of an encoded mesh.
-  const base::vector<std::uint32_t> plain = decodedIndices(mesh);
-  const base::vector<std::uint32_t>* indices =
-      listMember<std::uint32_t>(mesh, mesh_schema::indices()) ? &plain : nullptr;
-  const auto* triIndices = listMember<std::uint32_t>(mesh, mesh_schema::triIndices());
-  const auto* positionIndices = listMember<std::uint32_t>(mesh, mesh_schema::positionIndices());
+  const bool hasIndices = mesh.findVecAttribute<std::uint32_t>(mesh_schema::indices()) != nullptr;
+  const base::vector<std::uint32_t> plain = hasIndices ? decodedIndices(mesh) : base::vector<std::uint32_t>();
+  const base::vector<std::uint32_t>* indices = hasIndices ? &plain : nullptr;
+  bool valid = checkVertexData(mesh, name, vertices, plain.size());
+  const auto* triIndices = mesh.findVecAttribute<std::uint32_t>(mesh_schema::triIndices());
+  const auto* positionIndices = mesh.findVecAttribute<std::uint32_t>(mesh_schema::positionIndices());
 
   const base::AttribArray* primitives = findArrayMember(mesh, mesh_schema::primitives());
   bool indexed = false, perAttribute = false;
@@ -239,7 +232,7 @@ bool validateMesh(const base::AttribMap& mesh) {
   for (std::uint32_t i = 0; i < count; ++i) {
     const base::AttribMap* primitive = mapAt(*primitives, i);
     if (!primitive) continue;
-    const auto code = scalarMember<std::uint8_t>(*primitive, meshPrimitive_schema::topology());
+    const auto code = valueOf<std::uint8_t>(*primitive, meshPrimitive_schema::topology());
     const int topology = code ? *code : -1;
     std::optional<std::uint32_t> rangeCount;
     if (topology < 0 || topology == 1 || topology == 2 || topology == 4 || topology == 6) {
@@ -275,14 +268,14 @@ bool validateMesh(const base::AttribMap& mesh) {
       checkIndexValues(*positionIndices, vertices, name,
                        "validate |{}| Found position index out of range at position {}!");
     }
-    const auto* normals = listMember<base::normal>(mesh, mesh_schema::normals());
-    if (const auto* normalIndices = listMember<std::uint32_t>(mesh, mesh_schema::normalIndices());
+    const auto* normals = mesh.findVecAttribute<base::normal>(mesh_schema::normals());
+    if (const auto* normalIndices = mesh.findVecAttribute<std::uint32_t>(mesh_schema::normalIndices());
         normalIndices && normals) {
       checkIndexValues(*normalIndices, normals->size(), name,
                        "validate |{}| Found normal index out of range at position {}!");
     }
-    const auto* tangents = listMember<base::base_vec3<float>>(mesh, mesh_schema::tangents());
-    if (const auto* tangentIndices = listMember<std::uint32_t>(mesh, mesh_schema::tangentIndices());
+    const auto* tangents = mesh.findVecAttribute<base::base_vec3<float>>(mesh_schema::tangents());
+    if (const auto* tangentIndices = mesh.findVecAttribute<std::uint32_t>(mesh_schema::tangentIndices());
         tangentIndices && tangents) {
       checkIndexValues(*tangentIndices, tangents->size(), name,
                        "validate |{}| Found tangent index out of range at position {}!");

@@ -1,18 +1,23 @@
 // The binary forms of attributes and maps: round trips, left-out members, members of types
 // the reader lacks, and inputs that end early or count more than they hold.
 
+#include "address_limit.h"
+#include "b_attrib_array.h"
 #include "b_attribute_map.h"
 #include "b_box.h"
 #include "b_color.h"
 #include "b_matrix.h"
 #include "b_murmurhash3.h"
 #include "b_normal.h"
+#include "b_plugin_attribute.h"
+#include "b_plugin_factory.h"
 #include "b_quat.h"
 #include "b_timecode.h"
 #include "b_typed_attribute.h"
 #include "b_vec.h"
 #include "log_capture.h"
 #include "test_streams.h"
+#include "thrown.h"
 
 #include <gtest/gtest.h>
 
@@ -164,6 +169,119 @@ TEST(AttributeBinary, TruncatedAndHostileInputsFailCleanly) {
   EXPECT_THROW(list.read(pipe, base::plainContext()), base::exception);
   EXPECT_LE(list.values().capacity(), 1u << 16);
 }
+
+// The plain binary form of `levels` maps (or arrays) each holding the next, the innermost
+// empty: built by hand, since nothing that writes would nest this deep.
+base::string nestedForm(std::uint32_t levels, bool arrays) {
+  const auto put = [](base::string& bytes, auto value) {
+    bytes.append(reinterpret_cast<const char*>(&value), sizeof value);
+  };
+  const auto putName = [&](base::string& bytes, std::string_view name) {
+    put(bytes, static_cast<std::uint32_t>(name.size()));
+    bytes.append(name);
+  };
+  // Each level but the innermost: its flags, one member (or element), the child's type and
+  // byte length; the children follow one another, so each length is what comes after it.
+  const std::size_t header = 1 + 4 + (arrays ? 0 : 4 + 1) + 4 + (arrays ? 5 : 3) + 4;
+  const std::size_t innermost = 1 + 4;
+  base::string bytes;
+  bytes.reserve((levels - 1) * header + innermost);
+  for (std::uint32_t level = 1; level < levels; ++level) {
+    put(bytes, std::uint8_t(0));
+    put(bytes, std::uint32_t(1));
+    if (!arrays) putName(bytes, "m");
+    putName(bytes, arrays ? "array" : "map");
+    put(bytes, static_cast<std::uint32_t>((levels - 1 - level) * header + innermost));
+  }
+  put(bytes, std::uint8_t(0));
+  put(bytes, std::uint32_t(0));
+  return bytes;
+}
+
+TEST(AttributeBinary, NestingDeeperThan256LevelsIsRefusedNotRecursedInto) {
+  for (const bool arrays : {false, true}) {
+    const auto readForm = [arrays](const base::string& bytes) {
+      base::Stream stream = base::memStream(bytes.data(), static_cast<std::int64_t>(bytes.size()), "deep");
+      std::unique_ptr<base::Attribute> attr(arrays ? static_cast<base::Attribute*>(new base::AttribArray)
+                                                   : new base::AttribMap);
+      attr->read(stream, base::plainContext());
+      return stream.getPosition() == stream.getSize();
+    };
+    const std::string refusal = "stream 'deep': the nesting of maps and arrays is deeper than 256 levels";
+    // Deep enough to overflow the stack of a reader that does not count.
+    EXPECT_EQ(stream_tests::thrownText([&] { readForm(nestedForm(40000, arrays)); }), refusal) << arrays;
+    EXPECT_EQ(stream_tests::thrownText([&] { readForm(nestedForm(257, arrays)); }), refusal) << arrays;
+    // The failed reads left the context's count where it was.
+    EXPECT_TRUE(readForm(nestedForm(256, arrays))) << arrays;
+  }
+}
+
+#if defined(MESHPORT_HAS_ADDRESS_LIMIT)
+
+// Runs `read` in a death-test child held to 64 MiB more than it holds. Exits with 0 when
+// the read fails with the short-read message, with allocationFailed when it ran out of
+// memory, with 4 on any other ending.
+template <class Read>
+[[noreturn]] void readUnderLimit(Read&& read) {
+  LogCapture quiet;
+  testing_support::limitAddressSpace(64u << 20);
+  try {
+    read();
+  } catch (const base::exception& error) {
+    _exit(std::string_view(error.what()).find("trying to read") != std::string_view::npos ? 0 : 4);
+  } catch (const std::bad_alloc&) {
+    _exit(testing_support::allocationFailed);
+  }
+  _exit(4);
+}
+
+// A count of up to 4 GiB over a few bytes from a stream that cannot tell its size: nothing
+// proves the count, so each form must grow with the data, never allocate the count first.
+TEST(AttributeBinary, CountsFromAStreamWithoutASizeAllocateOnlyWhatArrives) {
+  const auto bytes = [](std::initializer_list<std::uint8_t> head) {
+    std::string data(head.begin(), head.end());
+    return data + "abcdefgh";
+  };
+  const std::string text = bytes({0, 0xFF, 0xFF, 0xFF, 0xFF});
+  const std::string name = bytes({0, 0, 0, 0x10});                       // 256 MiB, the longest name allowed
+  const std::string objectList = bytes({1, 1, 0, 0, 0, 0, 0, 0, 0x10});  // one plug-in type of that name
+  for (const testing_support::Source source : {testing_support::Source::pipe, testing_support::Source::bufferedPipe}) {
+    const auto stream = [source](const std::string& data) { return testing_support::sourceStream(data, source); };
+    const char* kind = testing_support::sourceName(source);
+    EXPECT_EXIT(readUnderLimit([&] {
+                  base::Stream in = stream(text);
+                  base::TypedAttribute<base::string>().read(in, base::plainContext());
+                }),
+                ::testing::ExitedWithCode(0), "")
+        << "text, " << kind;
+    EXPECT_EXIT(readUnderLimit([&] {
+                  base::Stream in = stream(text);
+                  base::TypedVectorAttribute<double>().read(in, base::plainContext());
+                }),
+                ::testing::ExitedWithCode(0), "")
+        << "list, " << kind;
+    EXPECT_EXIT(readUnderLimit([&] {
+                  base::Stream in = stream(text);
+                  base::PluginVectorAttribute().read(in, base::plainContext());
+                }),
+                ::testing::ExitedWithCode(0), "")
+        << "plug-in references, " << kind;
+    EXPECT_EXIT(readUnderLimit([&] {
+                  base::Stream in = stream(name);
+                  base::plainContext().readName(in);
+                }),
+                ::testing::ExitedWithCode(0), "")
+        << "name, " << kind;
+    EXPECT_EXIT(readUnderLimit([&] {
+                  base::Stream in = stream(objectList);
+                  base::PluginFactory("objects").read(in);
+                }),
+                ::testing::ExitedWithCode(0), "")
+        << "object list, " << kind;
+  }
+}
+
+#endif
 
 // A stored bool byte other than 0 or 1 reads as true and is written back as 1.
 TEST(AttributeBinary, BoolBytesOtherThanZeroAndOneReadAsTrue) {

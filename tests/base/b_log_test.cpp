@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <cstdio>
+#include <filesystem>
 #include <fstream>
 #include <sstream>
 
@@ -70,6 +71,29 @@ TEST(Log, FileSinkAppendsLevelCategoryAndTextOrSaysWhyItCannot) {
 
   EXPECT_FALSE(base::log().setFile("/nonexistent-dir/x/log.txt", error));
   EXPECT_EQ(error, "No such file or directory");
+}
+
+// The path is UTF-8 on every system: a folder named in Cyrillic and Chinese holds
+// the log like any other (Windows' narrow fopen would read the name in its code page).
+TEST(Log, FileSinkWritesIntoAFolderWithANonAsciiName) {
+  const std::filesystem::path folder =
+      std::filesystem::path(::testing::TempDir()) / u8"\u0436\u0443\u0440\u043d\u0430\u043b \u65e5\u5fd7";
+  std::filesystem::remove_all(folder);
+  ASSERT_TRUE(std::filesystem::create_directory(folder));
+  const std::u8string utf8 = (folder / "log.txt").u8string();
+  std::string error;
+  {
+    LogCapture capture;
+    ASSERT_TRUE(base::log().setFile(std::string(utf8.begin(), utf8.end()), error)) << error;
+    base::log().message(base::logIO, base::logWarning, "written in a named folder");
+    ASSERT_TRUE(base::log().setFile("", error));
+  }
+  std::ifstream file(folder / "log.txt");
+  std::stringstream content;
+  content << file.rdbuf();
+  EXPECT_NE(content.str().find("warning [io] written in a named folder\n"), std::string::npos) << content.str();
+  file.close();
+  std::filesystem::remove_all(folder);
 }
 
 // A sink that logs while it writes: before the fix this deadlocked on the log's own lock.

@@ -6,6 +6,7 @@
 #include "b_color.h"
 #include "b_normal.h"
 #include "b_vec.h"
+#include "linked_member.h"
 #include "log_capture.h"
 #include "ply_recorder.h"
 #include "scene_import.h"
@@ -324,6 +325,46 @@ TEST(PlyExport, AFailedWriteNamesTheFileAndLeavesNothingBehind) {
             0u);
   EXPECT_TRUE(stdfs::is_directory(taken));
   EXPECT_EQ(folder.names(), std::vector<std::string>{"taken.ply"});
+}
+
+// Strips read their indices run by run: runs that together pass the primitive's range would
+// make the writer read past the index list.
+TEST(PlyExport, StripsLongerThanTheirRangeAreRefused) {
+  const ImportedScene imported = importFile(MESHPORT_TEST_DATA "/ply/valid/binary_be_tristrips_material.ply");
+  base::AttribMap& primitive = imported.primitive(0);
+  auto* strips = const_cast<base::vector<std::uint32_t>*>(
+      scene::listMember<std::uint32_t>(primitive, meshPrimitive_schema::ecounts()));
+  ASSERT_TRUE(strips && !strips->empty());
+  const std::uint32_t range = *scene::scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexCount());
+  std::uint64_t total = 0;
+  for (const std::uint32_t n : *strips) total += n;
+  strips->back() += range - static_cast<std::uint32_t>(total) + 1000;
+  const ExportFolder folder;
+  const std::string path = folder.file("strips.ply");
+  EXPECT_EQ(stream_tests::thrownText([&] { exportScene(imported, path); }),
+            fmt::format("{}: a primitive's strips have {} indices, its range {}", path, range + 1000, range));
+  EXPECT_TRUE(folder.names().empty());
+}
+
+// A member stored as a link is written as the member it leads to, as maps read it.
+TEST(PlyExport, LinkedMembersAreWrittenAsTheMembersTheyLeadTo) {
+  const ImportedScene imported = importFile(MESHPORT_TEST_DATA "/ply/valid/ascii_tetrahedron_normals_colors.ply");
+  base::IPlugin& mesh = imported.mesh();
+  scene::decodeIndexDeltas(mesh);  // an index list behind a link holds plain indices
+  const ExportFolder folder;
+  ASSERT_TRUE(exportScene(imported, folder.file("stored.ply")));
+  for (const base::name_id name : {mesh_schema::positions(), mesh_schema::normals(), mesh_schema::indices()}) {
+    testing_support::moveBehindLink(mesh, name);
+  }
+  for (const base::name_id name :
+       {meshPrimitive_schema::indexStart(), meshPrimitive_schema::indexCount(), meshPrimitive_schema::vcounts()}) {
+    testing_support::moveBehindLink(imported.primitive(0), name);
+  }
+  base::AttribMap* colours = scene::mapAt(*scene::findArrayMember(mesh, mesh_schema::colorSets()), 0);
+  ASSERT_TRUE(colours && colours->findMember(meshColorSet_schema::RGB()));
+  testing_support::moveBehindLink(*colours, meshColorSet_schema::RGB());
+  ASSERT_TRUE(exportScene(imported, folder.file("linked.ply")));
+  EXPECT_EQ(readText(folder.file("linked.ply")), readText(folder.file("stored.ply")));
 }
 
 TEST(PlyExport, ASceneWithoutMeshesSaysSo) {

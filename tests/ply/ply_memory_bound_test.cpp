@@ -4,6 +4,7 @@
 // fails, and the child reports it by its exit status. Gzip files are held to the size of
 // the data they hold: their stream has no size, so no count is bounded before data arrives.
 
+#include "address_limit.h"
 #include "b_exception.h"
 #include "gzip_data.h"
 #include "log_capture.h"
@@ -14,38 +15,26 @@
 #include <filesystem>
 #include <new>
 
-#if !defined(_WIN32)
-#  include <sys/resource.h>
-#  include <unistd.h>
-
-#  include <fstream>
-#  include <iterator>
-#  include <string>
-#  include <vector>
-#endif
+#include <fstream>
+#include <iterator>
+#include <string>
+#include <vector>
 
 namespace {
 
 namespace stdfs = std::filesystem;
 
-#if !defined(_WIN32) && !defined(__SANITIZE_ADDRESS__)
+#if defined(MESHPORT_HAS_ADDRESS_LIMIT)
+
+using testing_support::allocationFailed;
 
 constexpr std::uint64_t fixedBytes = 16u << 20;
 constexpr std::uint64_t bytesPerFileByte = 16;
-constexpr int allocationFailed = 3;
-
-std::uint64_t addressSpaceInUse() {
-  std::uint64_t pages = 0;
-  std::ifstream("/proc/self/statm") >> pages;
-  return pages * static_cast<std::uint64_t>(sysconf(_SC_PAGESIZE));
-}
 
 [[noreturn]] void importUnderLimit(const stdfs::path& path, std::uint64_t dataBytes = 0) {
   testing_support::LogCapture quiet;
   if (dataBytes == 0) dataBytes = stdfs::file_size(path);
-  const rlimit limit{addressSpaceInUse() + fixedBytes + bytesPerFileByte * dataBytes, RLIM_INFINITY};
-  setrlimit(RLIMIT_AS, &limit);
-  std::set_new_handler([] { _exit(allocationFailed); });
+  testing_support::limitAddressSpace(fixedBytes + bytesPerFileByte * dataBytes);
   try {
     testing_support::importFile(path.string());
   } catch (const base::exception&) {

@@ -165,6 +165,23 @@ TEST_F(SceneFactoryTest, ParametersAndSaving) {
   EXPECT_TRUE(factory.objects().empty());
 }
 
+// A host's round: parameters, import, export. Each call's importer or exporter object is its
+// own and never listed, so nothing is removed afterwards either: removing what was never
+// listed is logged as a misuse.
+TEST_F(SceneFactoryTest, ImportingAndSavingRemoveNothing) {
+  reload("");
+  log.entries.clear();
+  base::PluginFactory scene("scene");
+  base::AttribMap parameters;
+  EXPECT_TRUE(factory.getImporterParameters("model.alpha", parameters));
+  EXPECT_TRUE(factory.load(scene, "model.alpha", parameters));
+  base::AttribMap exportParameters;
+  EXPECT_TRUE(factory.getExporterParameters("out.alpha", exportParameters));
+  EXPECT_TRUE(factory.save(scene, "out.alpha", exportParameters));
+  EXPECT_FALSE(logged(log, "Attempt to remove"));
+  EXPECT_TRUE(factory.objects().empty());
+}
+
 TEST_F(SceneFactoryTest, SupportedExtensions) {
   reload("");
   EXPECT_EQ(factory.getSupportedExtensions(true), "alpha;beta;gamma;ply;raw.ply;shared;shared|Shared test format");

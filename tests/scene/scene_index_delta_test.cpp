@@ -1,5 +1,6 @@
 #include "scene_index_delta.h"
 #include "b_attrib_array.h"
+#include "linked_member.h"
 #include "log_capture.h"
 #include "scene_mesh.h"
 #include "scene_schema.h"
@@ -128,6 +129,30 @@ TEST(IndexDeltas, RangesStayInsideTheChannelAndHoldWholeFaces) {
     scene::decodeIndexDeltas(*made);
     EXPECT_EQ(indicesOf(*made), expected) << primitives[0].start << " " << primitives[0].count;
   }
+}
+
+// What the encoding rewrites must be the mesh's own: a primitive whose count list is a link
+// (which others may share) is left alone, by decoding too. A linked range or single count is
+// only read, so it is followed.
+TEST(IndexDeltas, ALinkedCountListIsNotEncodedAndALinkedRangeIsFollowed) {
+  const Indices plain{4, 5, 6, 2, 0, 1, 9, 8, 7, 6, 3, 2, 1};
+  const auto made = makeMesh(plain, {{0, 6, 3, {}}, {6, 7, 0, {4, 3}}});
+  base::AttribMap& mesh = *made;
+  base::AttribArray& primitives = scene::arrayMember(mesh, mesh_schema::primitives());
+  for (const base::name_id name :
+       {meshPrimitive_schema::indexStart(), meshPrimitive_schema::indexCount(), meshPrimitive_schema::vcounts()}) {
+    testing_support::moveBehindLink(*scene::mapAt(primitives, 0), name);
+  }
+  testing_support::moveBehindLink(*scene::mapAt(primitives, 1), meshPrimitive_schema::vcounts());
+  ASSERT_TRUE(scene::encodeIndexDeltas(mesh));
+  EXPECT_EQ(indicesOf(mesh), (Indices{0, 1, 2, 4, 1, 2, 9, 8, 7, 6, 3, 2, 1}));
+  const scene::FaceCounts linked = scene::faceCountsOf(*scene::mapAt(primitives, 1));
+  ASSERT_NE(linked.perFace, nullptr);
+  EXPECT_EQ(*linked.perFace, (base::vector<std::uint16_t>{4, 3}));
+  const Indices back{0, 1, 2, 4, 5, 6, 9, 8, 7, 6, 3, 2, 1};
+  EXPECT_EQ(scene::decodedIndices(mesh), back);
+  ASSERT_TRUE(scene::decodeIndexDeltas(mesh));
+  EXPECT_EQ(indicesOf(mesh), back);
 }
 
 TEST(IndexDeltas, MeshesThatCannotBeEncodedAreLeftAlone) {

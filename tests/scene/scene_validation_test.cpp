@@ -2,6 +2,7 @@
 #include "b_attrib_array.h"
 #include "b_normal.h"
 #include "b_vec.h"
+#include "linked_member.h"
 #include "log_capture.h"
 #include "scene_index_delta.h"
 #include "scene_mesh.h"
@@ -11,6 +12,7 @@
 
 #include <cmath>
 #include <limits>
+#include <memory>
 #include <string>
 #include <vector>
 
@@ -19,6 +21,7 @@ namespace {
 using scene::mesh_schema;
 using scene::meshPrimitive_schema;
 using testing_support::LogCapture;
+using testing_support::moveBehindLink;
 using Vec3 = base::base_vec3<float>;
 using Indices = base::vector<std::uint32_t>;
 
@@ -150,6 +153,52 @@ TEST(ValidateMesh, StripsAreCheckedByTheirCounts) {
   mesh.attribute(mesh_schema::indices(), Indices{0, 1, 2, 3, 4, 5, 6});
   addPrimitive(mesh).attribute(meshPrimitive_schema::ecounts(), base::vector<std::uint32_t>{4, 3});
   EXPECT_TRUE(validate(mesh).findings.empty());
+}
+
+// A member stored as a link reads as the member it leads to: linked positions, indices and
+// face counts (one count or a list) validate and count as stored ones do.
+TEST(ValidateMesh, LinkedMembersValidateAndCountLikeStoredOnes) {
+  for (const bool countList : {false, true}) {
+    base::AttribMap stored;
+    makeTriangles(stored, 4, {0, 1, 2, 0, 2, 5});  // one index past the vertices
+    base::AttribArray& primitives = scene::arrayMember(stored, mesh_schema::primitives());
+    if (countList) {
+      scene::mapAt(primitives, 0)->attribute(meshPrimitive_schema::vcounts(), base::vector<std::uint16_t>{3, 3});
+    }
+    const std::unique_ptr<base::AttribMap> linked(static_cast<base::AttribMap*>(stored.clone()));
+    moveBehindLink(*linked, mesh_schema::positions());
+    moveBehindLink(*linked, mesh_schema::indices());
+    moveBehindLink(*scene::mapAt(scene::arrayMember(*linked, mesh_schema::primitives()), 0),
+                   meshPrimitive_schema::vcounts());
+    const Validation expected = validate(stored);
+    ASSERT_EQ(expected.findings.size(), 1u);
+    const Validation got = validate(*linked);
+    EXPECT_EQ(got.findings, expected.findings) << countList;
+    EXPECT_EQ(got.valid, expected.valid) << countList;
+    EXPECT_EQ(scene::getFaceCount(*linked), 2u) << countList;
+    EXPECT_EQ(scene::getTriangleCount(*linked), 2u) << countList;
+  }
+}
+
+// A member of another type than the one read is reported as the map's typed lookups report
+// it, not passed over as if it were absent.
+TEST(ValidateMesh, MistypedIndicesAndRangesAreReported) {
+  base::AttribMap mesh;
+  makeTriangles(mesh, 3, {0, 1, 2});
+  mesh.attribute(mesh_schema::indices(), base::vector<float>{0, 1, 2});
+  EXPECT_EQ(validate(mesh).findings,
+            (std::vector<std::string>{"error: map attribute| Detected invalid access to attribute 'indices'. Expected "
+                                      "type 'uint32[]', actual attribute type - 'float[]'!",
+                                      "warning: validate |m| Missing indices!"}));
+
+  base::AttribMap ranged;
+  makeTriangles(ranged, 3, {0, 1, 2});
+  base::AttribMap& primitive = *scene::mapAt(scene::arrayMember(ranged, mesh_schema::primitives()), 0);
+  primitive.attribute<float>(meshPrimitive_schema::indexStart(), 0);
+  primitive.attribute<std::uint32_t>(meshPrimitive_schema::indexCount(), 3);
+  EXPECT_EQ(validate(ranged).findings,
+            (std::vector<std::string>{"error: map attribute| Detected invalid access to attribute 'indexStart'. "
+                                      "Expected 'uint32', actual attribute type - 'float'"}));
 }
 
 TEST(ValidateMesh, ADeltaEncodedMeshIsCheckedOnItsPlainIndices) {
