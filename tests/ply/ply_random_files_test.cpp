@@ -149,7 +149,8 @@ void expectFileHolds(const std::string& name, const std::string& bytes, Checks c
 // Writes a random file that failed where a developer finds it.
 void keepFailure(const testing_support::GeneratedFile& file) {
   stdfs::create_directories("random_ply_failures");
-  const stdfs::path path = stdfs::absolute(stdfs::path("random_ply_failures") / (testing_support::describe(file) + ".ply"));
+  const stdfs::path path =
+      stdfs::absolute(stdfs::path("random_ply_failures") / (testing_support::describe(file) + ".ply"));
   std::ofstream(path, std::ios::binary) << file.bytes;
   ADD_FAILURE() << testing_support::describe(file) << (file.broken.empty() ? "" : " (" + file.broken + ")")
                 << " failed; the file is kept as " << path.string()
@@ -224,14 +225,14 @@ TEST_P(EveryFile, ImportsAsItIsAndRoundTrips) {
   const std::string folder = path.parent_path().filename().string();
   const bool faulty = folder == "invalid" || path.filename().string().starts_with("invalid-");
   expectFileHolds(path.filename().string(), bytes,
-                  faulty                 ? Checks::reading
+                  faulty              ? Checks::reading
                   : folder == "files" ? Checks::roundTrip
-                                         : Checks::all);
+                                      : Checks::all);
 }
 
 INSTANTIATE_TEST_SUITE_P(Files, EveryFile, testing::ValuesIn(filesToCheck()), [](const auto& info) {
-  std::string name = stdfs::path(info.param).parent_path().filename().string() + "_" +
-                     stdfs::path(info.param).stem().string();
+  std::string name =
+      stdfs::path(info.param).parent_path().filename().string() + "_" + stdfs::path(info.param).stem().string();
   std::replace_if(
       name.begin(), name.end(), [](char c) { return !std::isalnum(static_cast<unsigned char>(c)); }, '_');
   return name;

@@ -182,7 +182,8 @@ class Expectation {
         // An instance that could not be read keeps its place: an empty list, or its value
         // as far as it was read.
         const ply::ValueArray& values = raw.instances[i][p];
-        text += fmt::format(" {}", raw.dropped[i] && property.isList ? keptText(property, {}) : keptText(property, values));
+        text +=
+            fmt::format(" {}", raw.dropped[i] && property.isList ? keptText(property, {}) : keptText(property, values));
       }
       digest.keptVertexProperties.push_back(text);
     }
@@ -217,7 +218,8 @@ class Expectation {
         const ply::Property& property = element.properties[p];
         if (property.semantic != PropertySemantic::vertexIndex) continue;
         std::vector<std::uint32_t> indices;
-        for (const ply::Value& value : raw.instances[i][p]) indices.push_back(indexOf(value, property.type, m_vertices));
+        for (const ply::Value& value : raw.instances[i][p])
+          indices.push_back(indexOf(value, property.type, m_vertices));
         if (indices.size() > 65535 && element.semantic != ply::ElementSemantic::tristrips) result.fails = true;
         each(i, indices);
       }
@@ -375,9 +377,9 @@ std::vector<KeptColumn> keptColumnsOf(const base::AttribMap& mesh) {
       std::size_t at = 0;
       for (const double count : counts) {
         const auto n = static_cast<std::size_t>(count);
-        column.values.push_back(fmt::format("{}=[{}]", name, fmt::join(items.begin() + static_cast<std::ptrdiff_t>(at),
-                                                                        items.begin() + static_cast<std::ptrdiff_t>(at + n),
-                                                                        " ")));
+        column.values.push_back(fmt::format("{}=[{}]", name,
+                                            fmt::join(items.begin() + static_cast<std::ptrdiff_t>(at),
+                                                      items.begin() + static_cast<std::ptrdiff_t>(at + n), " ")));
         at += n;
       }
     }
@@ -413,7 +415,8 @@ std::string colourEntry(const base::AttribMap& set, std::uint32_t entry) {
 std::vector<std::string> primitiveFaces(const base::AttribMap& mesh, const base::AttribMap& primitive,
                                         std::int32_t index, const base::vector<std::uint32_t>& indices,
                                         const std::vector<KeptColumn>& kept) {
-  const std::uint32_t start = scene::scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexStart()).value_or(0);
+  const std::uint32_t start =
+      scene::scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexStart()).value_or(0);
   const std::uint32_t count = scene::scalarMember<std::uint32_t>(primitive, meshPrimitive_schema::indexCount())
                                   .value_or(static_cast<std::uint32_t>(indices.size()));
   std::vector<std::string> texts;
@@ -438,12 +441,13 @@ std::vector<std::string> primitiveFaces(const base::AttribMap& mesh, const base:
   for (std::size_t f = 0; f < sizes.size(); ++f) {
     Face face{{indices.begin() + at, indices.begin() + at + sizes[f]}, {}, {}, {}};
     for (std::uint32_t c = at; uvSet && c < at + sizes[f]; ++c) {
-      const auto& uv = scene::listMember<base::base_vec2<float>>(*uvSet, meshUVSet_schema::UV())->at(
-          scene::listMember<std::uint32_t>(*uvSet, meshUVSet_schema::indices())->at(c));
+      const auto& uv = scene::listMember<base::base_vec2<float>>(*uvSet, meshUVSet_schema::UV())
+                           ->at(scene::listMember<std::uint32_t>(*uvSet, meshUVSet_schema::indices())->at(c));
       face.uvs.push_back(uvText(uv.x, uv.y));
     }
     if (colourSet) {
-      face.colour = colourEntry(*colourSet, scene::listMember<std::uint32_t>(*colourSet, meshUVSet_schema::indices())->at(at));
+      face.colour =
+          colourEntry(*colourSet, scene::listMember<std::uint32_t>(*colourSet, meshUVSet_schema::indices())->at(at));
     }
     for (const KeptColumn& column : kept) {
       if (column.primitive == index) face.kept.push_back(column.values.at(f));
@@ -497,8 +501,8 @@ ExpectedImport expectedImport(const std::string& bytes) {
   }
   for (const RawElement& element : raw.elements) {
     expectation.add(element);
-    expectation.result.incomplete |= std::find(element.dropped.begin(), element.dropped.end(), true) !=
-                                     element.dropped.end();
+    expectation.result.incomplete |=
+        std::find(element.dropped.begin(), element.dropped.end(), true) != element.dropped.end();
   }
   expectation.result.incomplete |= read == ply::ReadResult::bodyEndedEarly;
   return expectation.result;

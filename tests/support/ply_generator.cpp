@@ -20,10 +20,13 @@ const std::vector<DataType> allTypes = {DataType::int8,  DataType::uint8,  DataT
 
 // Names that no semantic claims: plain, in UTF-8, in Latin-1 (not UTF-8), with bytes that
 // no word may hold.
-const std::vector<std::string> keptNames = {"quality",   "confidence",         "intensity",  "label",
-                                            "scalar_i",  "\xC3\xA9t\xC3\xA9", "\xE6\xB8\xA9\xE5\xBA\xA6",
-                                            "qualit\xE9", "a,b",               "#tag"};
-const std::vector<std::string> unknownElementNames = {"camera", "range_grid", "donn\xC3\xA9""es", "blob", "meta"};
+const std::vector<std::string> keptNames = {
+    "quality",    "confidence", "intensity", "label", "scalar_i", "\xC3\xA9t\xC3\xA9", "\xE6\xB8\xA9\xE5\xBA\xA6",
+    "qualit\xE9", "a,b",        "#tag"};
+const std::vector<std::string> unknownElementNames = {"camera", "range_grid",
+                                                      "donn\xC3\xA9"
+                                                      "es",
+                                                      "blob", "meta"};
 
 // A value of `type`, exact in it: a real of a few digits, or any integer of the type.
 double randomValue(Random& random, DataType type) {
@@ -96,8 +99,8 @@ void addColours(Random& random, std::vector<PropertyPlan>& plans) {
   if (random.chance(40)) channels.push_back("alpha");
   for (const std::string& channel : channels) {
     const DataType own = channel == "alpha" && random.chance(30) ? anyType(random) : type;
-    plans.push_back({scalar(channel, own),
-                     [own](Random& r, std::size_t) { return std::vector<double>{randomChannel(r, own)}; }});
+    plans.push_back(
+        {scalar(channel, own), [own](Random& r, std::size_t) { return std::vector<double>{randomChannel(r, own)}; }});
   }
 }
 
@@ -167,7 +170,8 @@ void orderInstances(Random& random, ModelElement& element, std::size_t indexProp
   });
   if (order == FaceOrder::reversed) std::reverse(instances.begin(), instances.end());
   if (order == FaceOrder::blockShuffled && instances.size() > 1) {
-    const std::size_t size = std::max<std::size_t>(1, instances.size() / static_cast<std::size_t>(random.between(2, 8)));
+    const std::size_t size =
+        std::max<std::size_t>(1, instances.size() / static_cast<std::size_t>(random.between(2, 8)));
     std::vector<std::vector<std::vector<std::vector<double>>>> blocks;
     for (std::size_t at = 0; at < instances.size(); at += size) {
       blocks.emplace_back(instances.begin() + static_cast<std::ptrdiff_t>(at),
@@ -180,24 +184,25 @@ void orderInstances(Random& random, ModelElement& element, std::size_t indexProp
 }
 
 ModelElement faceElement(Random& random, std::size_t vertices) {
-  const std::size_t count =
-      random.chance(20) ? vertices : static_cast<std::size_t>(random.between(1, std::min<std::int64_t>(400, 2 * vertices)));
+  const std::size_t count = random.chance(20)
+                                ? vertices
+                                : static_cast<std::size_t>(random.between(
+                                      1, std::min<std::int64_t>(vertices > 1000 ? 20000 : 400, 2 * vertices)));
   const double top = static_cast<double>(vertices - 1);
   std::vector<PropertyPlan> plans;
   // One index list, or two: each gives a face of the instance.
   const std::size_t lists = random.chance(10) ? 2 : 1;
   for (std::size_t k = 0; k < lists; ++k) {
-    plans.push_back({list(k == 0 ? "vertex_indices" : "vertex_index", typeHolding(random, 0, top),
-                          typeHolding(random, 0, 8)),
-                     [vertices](Random& r, std::size_t) { return randomFace(r, vertices); }});
+    plans.push_back(
+        {list(k == 0 ? "vertex_indices" : "vertex_index", typeHolding(random, 0, top), typeHolding(random, 0, 8)),
+         [vertices](Random& r, std::size_t) { return randomFace(r, vertices); }});
   }
   if (random.chance(35)) addColours(random, plans);
   if (random.chance(30)) {
     // Filled once the corners are known: two values per corner, or now and then any number.
     const DataType type = random.chance(80) ? DataType::float32 : anyType(random);
-    plans.push_back({list("texcoord", type, typeHolding(random, 0, 40)), [](Random&, std::size_t) {
-                       return std::vector<double>{};
-                     }});
+    plans.push_back({list("texcoord", type, typeHolding(random, 0, 40)),
+                     [](Random&, std::size_t) { return std::vector<double>{}; }});
   }
   addKeptProperties(random, plans);
   ModelElement element = elementOf("face", count, std::move(plans), random);
@@ -250,12 +255,11 @@ ModelElement stripElement(Random& random, std::size_t vertices) {
 
 ModelElement edgeElement(Random& random, std::size_t vertices) {
   std::vector<PropertyPlan> plans;
-  plans.push_back({list("vertex_indices", typeHolding(random, 0, static_cast<double>(vertices - 1)),
-                        typeHolding(random, 0, 2)),
-                   [vertices](Random& r, std::size_t) {
-                     return std::vector<double>{static_cast<double>(r.below(vertices)),
-                                                static_cast<double>(r.below(vertices))};
-                   }});
+  plans.push_back(
+      {list("vertex_indices", typeHolding(random, 0, static_cast<double>(vertices - 1)), typeHolding(random, 0, 2)),
+       [vertices](Random& r, std::size_t) {
+         return std::vector<double>{static_cast<double>(r.below(vertices)), static_cast<double>(r.below(vertices))};
+       }});
   if (random.chance(20)) {
     plans.push_back({scalar("crease", DataType::float32),
                      [](Random& r, std::size_t) { return std::vector<double>{randomValue(r, DataType::float32)}; }});
@@ -290,8 +294,10 @@ ModelElement unknownElement(Random& random, std::size_t vertices) {
 }
 
 PlyModel randomModel(Random& random) {
-  const std::size_t vertices =
-      static_cast<std::size_t>(random.chance(10) ? random.between(128, 300) : random.between(3, 60));
+  // Now and then a file larger than the reader's window, so that values straddle its refills.
+  const std::size_t vertices = static_cast<std::size_t>(random.chance(2)    ? random.between(2000, 6000)
+                                                        : random.chance(10) ? random.between(128, 300)
+                                                                            : random.between(3, 60));
   enum class Kind { vertex, face, strips, edge, unknown };
   std::vector<Kind> kinds = {Kind::vertex, Kind::face};
   if (random.chance(15)) kinds.push_back(Kind::vertex);
@@ -352,8 +358,8 @@ bool breakAnIndex(Random& random, GeneratedFile& file) {
   ModelElement& element = file.model.elements[e];
   std::vector<double>& corners = element.values[random.below(element.values.size())][p];
   const double high = std::min(highestOf(element.properties[p].type), vertices + 1000);
-  corners[random.below(corners.size())] = static_cast<double>(random.between(static_cast<std::int64_t>(vertices),
-                                                                             static_cast<std::int64_t>(high)));
+  corners[random.below(corners.size())] =
+      static_cast<double>(random.between(static_cast<std::int64_t>(vertices), static_cast<std::int64_t>(high)));
   file.bytes = writeModel(file.model, file.encoding);
   file.broken = fmt::format("an index past the vertices in element '{}'", element.name);
   file.expectedMessage = fmt::format("Element '{}': 1 invalid vertex index was stored as 0", element.name);
@@ -398,7 +404,8 @@ void cutTheBody(Random& random, GeneratedFile& file) {
   std::size_t cut = body + random.below(std::max<std::size_t>(length, 1));
   // A cut inside an ASCII word leaves a shorter number that reads like any other: cut before
   // the word, so that a value is missing.
-  while (file.encoding == ply::Encoding::ascii && cut > body && !std::isspace(static_cast<unsigned char>(file.bytes[cut - 1]))) {
+  while (file.encoding == ply::Encoding::ascii && cut > body &&
+         !std::isspace(static_cast<unsigned char>(file.bytes[cut - 1]))) {
     --cut;
   }
   file.bytes.resize(cut);

@@ -57,8 +57,8 @@ void putValue(std::string& out, double value, ply::DataType type, ply::Encoding 
 }
 
 std::string headerOf(const PlyModel& model, ply::Encoding encoding) {
-  std::string text = fmt::format("ply\nformat {} 1.0\ncomment made by the random file generator\n",
-                                 ply::encodingWord(encoding));
+  std::string text =
+      fmt::format("ply\nformat {} 1.0\ncomment made by the random file generator\n", ply::encodingWord(encoding));
   for (const ModelElement& element : model.elements) {
     text += fmt::format("element {} {}\n", element.name, element.values.size());
     for (const ModelProperty& property : element.properties) {
