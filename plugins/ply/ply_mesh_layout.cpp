@@ -270,7 +270,9 @@ void MeshLayout::addPrimitive(const base::AttribMap& primitive, std::uint32_t in
     refuse(fmt::format("a primitive names indices {} to {} of {}", start, std::uint64_t(start) + corners,
                        m_indices.size()));
   }
-  if (corners == 0) return;  // points: the vertices say it all
+  // Points: the vertices say it all. Faces without corners still carry their own values.
+  const scene::FaceCounts counts = scene::faceCountsOf(primitive);
+  if (corners == 0 && !(counts.perFace && !counts.perFace->empty())) return;
   WriteProperty indices = scalar("vertex_indices", DataType::int32, m_indices.data() + start, 4);
   indices.isList = true;
   if (const auto* strips = primitive.findVecAttribute<std::uint32_t>(meshPrimitive_schema::ecounts())) {
@@ -283,14 +285,26 @@ void MeshLayout::addPrimitive(const base::AttribMap& primitive, std::uint32_t in
     m_elements.push_back(WriteElement{"tristrips", strips->size(), {indices}});
     return;
   }
-  const scene::FaceCounts counts = scene::faceCountsOf(primitive);
-  if (counts.uniform == 2) {
+  // Faces of two corners each are edges, unless they carry a face element's own data.
+  if (counts.uniform == 2 && !hasFaceData(index, start, corners)) {
     if (!options.edges) return;
     indices.length = 2;
     m_elements.push_back(WriteElement{"edge", corners / 2, {indices}});
     return;
   }
   addFaceElement(primitive, index, start, corners, options);
+}
+
+bool MeshLayout::hasFaceData(std::uint32_t index, std::uint32_t start, std::uint32_t corners) const {
+  for (const KeptProperty& property : keptPropertiesOf(m_mesh)) {
+    if (property.primitive == static_cast<std::int32_t>(index)) return true;
+  }
+  for (const base::name_id sets : {mesh_schema::uvSets(), mesh_schema::colorSets()}) {
+    for (const base::AttribMap* set : setsOf(m_mesh, sets)) {
+      if (coversRange(*set, start, corners)) return true;
+    }
+  }
+  return false;
 }
 
 void MeshLayout::addFaceElement(const base::AttribMap& primitive, std::uint32_t index, std::uint32_t start,
@@ -372,11 +386,13 @@ void MeshLayout::addFaceColours(WriteElement& face, const base::AttribMap& set, 
   std::vector<float> colours;
   std::uint64_t corner = start;
   for (std::uint64_t f = 0; f < face.count; ++f) {
-    const std::uint32_t entry = channel[corner];
+    // A face without corners has none to carry its colour: it reads 0, never the next face's.
+    const std::uint32_t corners = faces.counts ? faces.counts[f] : faces.length;
+    const std::uint32_t entry = corners > 0 ? channel[corner] : noIndex;
     for (std::uint32_t c = 0; c < list.channels; ++c) {
       colours.push_back(entry < list.entries ? list.values[std::size_t(entry) * list.channels + c] : 0.0f);
     }
-    corner += faces.counts ? faces.counts[f] : faces.length;
+    corner += corners;
   }
   const auto* values = reinterpret_cast<const float*>(keep(colours));
   addChannels(face, values, face.count, list.channels, colourNames("", list.channels));

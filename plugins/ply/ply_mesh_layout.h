@@ -48,6 +48,9 @@ class MeshLayout {
   void addVertexUVSets(WriteElement& vertex);
   void addVertexColourSets(WriteElement& vertex);
   void addPrimitive(const base::AttribMap& primitive, std::uint32_t index, const ExportOptions& options);
+  /// Whether primitive `index` (its indices from `start` on) has per-face data: colours or
+  /// texture coordinates of its own, or kept properties.
+  bool hasFaceData(std::uint32_t index, std::uint32_t start, std::uint32_t corners) const;
   void addFaceElement(const base::AttribMap& primitive, std::uint32_t index, std::uint32_t start, std::uint32_t corners,
                       const ExportOptions& options);
   void addFaceUVs(WriteElement& face, const base::AttribMap& set, std::uint32_t start, const WriteProperty& faces);

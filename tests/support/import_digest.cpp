@@ -54,6 +54,11 @@ std::string textOf(const Face& face) {
     if (before(r, best)) best = r;
   }
   std::string text = "face";
+  // A face without corners has none to carry face-varying values: its colour is nowhere.
+  if (n == 0) {
+    for (const std::string& kept : face.kept) text += fmt::format(" | {}", kept);
+    return text;
+  }
   for (std::size_t j = 0; j < n; ++j) {
     const std::size_t k = (best + j) % n;
     text += fmt::format(" {}{}", face.corners[k], face.uvs.empty() ? std::string() : face.uvs[k]);
@@ -445,7 +450,7 @@ std::vector<std::string> primitiveFaces(const base::AttribMap& mesh, const base:
                            ->at(scene::listMember<std::uint32_t>(*uvSet, meshUVSet_schema::indices())->at(c));
       face.uvs.push_back(uvText(uv.x, uv.y));
     }
-    if (colourSet) {
+    if (colourSet && sizes[f] > 0) {
       face.colour =
           colourEntry(*colourSet, scene::listMember<std::uint32_t>(*colourSet, meshUVSet_schema::indices())->at(at));
     }

@@ -6,7 +6,6 @@
 
 #include <algorithm>
 #include <cctype>
-#include <cmath>
 #include <functional>
 #include <numeric>
 
@@ -28,14 +27,21 @@ const std::vector<std::string> unknownElementNames = {"camera", "range_grid",
                                                       "es",
                                                       "blob", "meta"};
 
+// 10 to the power of -3 to 6, written out: the math library's pow may round differently on
+// another platform, and a seed must give the same bytes everywhere.
+double scaleOf(Random& random, std::int64_t highest) {
+  static constexpr double scales[] = {1e-3, 1e-2, 1e-1, 1e0, 1e1, 1e2, 1e3, 1e4, 1e5, 1e6};
+  return scales[random.between(0, highest + 3)];
+}
+
 // A value of `type`, exact in it: a real of a few digits, or any integer of the type.
 double randomValue(Random& random, DataType type) {
   switch (type) {
     case DataType::float32:
       if (random.chance(5)) return -0.0;
-      return static_cast<float>((random.unit() - 0.5) * std::pow(10.0, static_cast<double>(random.between(-3, 4))));
+      return static_cast<float>((random.unit() - 0.5) * scaleOf(random, 4));
     case DataType::float64:
-      return (random.unit() - 0.5) * std::pow(10.0, static_cast<double>(random.between(-3, 6)));
+      return (random.unit() - 0.5) * scaleOf(random, 6);
     default:
       return static_cast<double>(
           random.between(static_cast<std::int64_t>(lowestOf(type)), static_cast<std::int64_t>(highestOf(type))));
@@ -92,13 +98,13 @@ void addKeptProperties(Random& random, std::vector<PropertyPlan>& plans) {
   }
 }
 
-// Three channels of one type, and an alpha of its own type at times.
-void addColours(Random& random, std::vector<PropertyPlan>& plans) {
+// Three channels of one type (named with `prefix`), and an alpha of its own type at times.
+void addColours(Random& random, std::vector<PropertyPlan>& plans, const std::string& prefix = "") {
   const DataType type = random.chance(50) ? DataType::uint8 : anyType(random);
-  std::vector<std::string> channels = {"red", "green", "blue"};
-  if (random.chance(40)) channels.push_back("alpha");
+  std::vector<std::string> channels = {prefix + "red", prefix + "green", prefix + "blue"};
+  if (random.chance(40)) channels.push_back(prefix + "alpha");
   for (const std::string& channel : channels) {
-    const DataType own = channel == "alpha" && random.chance(30) ? anyType(random) : type;
+    const DataType own = channel.ends_with("alpha") && random.chance(30) ? anyType(random) : type;
     plans.push_back(
         {scalar(channel, own), [own](Random& r, std::size_t) { return std::vector<double>{randomChannel(r, own)}; }});
   }
@@ -115,30 +121,43 @@ ModelElement elementOf(std::string name, std::size_t count, std::vector<Property
   return element;
 }
 
-ModelElement vertexElement(Random& random, std::size_t vertices) {
+// A vertex element; one that is not the first may leave out positions and add its lists to
+// the first one's. One UV pair, one colour group and one single channel at most, so that two
+// such elements stay within what an export can write.
+ModelElement vertexElement(Random& random, std::size_t vertices, bool first) {
   std::vector<PropertyPlan> plans;
   const auto real = [&] { return random.chance(70) ? DataType::float32 : anyType(random); };
-  const auto add = [&](const char* name, DataType type) {
+  const auto add = [&](const std::string& name, DataType type) {
     plans.push_back(
         {scalar(name, type), [type](Random& r, std::size_t) { return std::vector<double>{randomValue(r, type)}; }});
   };
-  for (const char* name : {"x", "y", "z"}) add(name, real());
+  if (first || random.chance(70)) {
+    for (const char* name : {"x", "y", "z"}) add(name, real());
+  }
   if (random.chance(30)) {
     for (const char* name : {"nx", "ny", "nz"}) add(name, real());
   }
   if (random.chance(25)) {
-    const auto [u, v] = random.pick(std::vector<std::pair<const char*, const char*>>{{"u", "v"}, {"s", "t"}});
+    const auto [u, v] = random.pick(std::vector<std::pair<std::string, std::string>>{
+        {"u", "v"}, {"s", "t"}, {"tx", "ty"}, {"texture_u", "texture_v"}, {"texture_s", "texture_t"}});
     add(u, real());
     add(v, real());
   }
-  if (random.chance(30)) addColours(random, plans);
+  if (random.chance(30)) {
+    addColours(random, plans, random.pick(std::vector<std::string>{"", "", "ambient_", "diffuse_", "specular_"}));
+  }
+  if (random.chance(10)) add(random.chance(50) ? "opacity" : "specular_power", real());
   addKeptProperties(random, plans);
   return elementOf("vertex", vertices, std::move(plans), random);
 }
 
-// A face's corners: three to eight vertices, distinct but now and then.
+// A face's corners: three to eight vertices (now and then none to two), distinct but now
+// and then.
 std::vector<double> randomFace(Random& random, std::size_t vertices) {
-  const std::size_t n = random.chance(60) ? 3 : random.chance(50) ? 4 : static_cast<std::size_t>(random.between(5, 8));
+  const std::size_t n = random.chance(2)    ? static_cast<std::size_t>(random.between(0, 2))
+                        : random.chance(60) ? 3
+                        : random.chance(50) ? 4
+                                            : static_cast<std::size_t>(random.between(5, 8));
   std::vector<double> corners;
   while (corners.size() < n) {
     const double corner = static_cast<double>(random.below(vertices));
@@ -198,6 +217,17 @@ ModelElement faceElement(Random& random, std::size_t vertices) {
          [vertices](Random& r, std::size_t) { return randomFace(r, vertices); }});
   }
   if (random.chance(35)) addColours(random, plans);
+  // Properties that a face element has no place for.
+  if (random.chance(10)) {
+    plans.push_back({scalar("material_index", DataType::int32),
+                     [](Random& r, std::size_t) { return std::vector<double>{static_cast<double>(r.below(4))}; }});
+  }
+  if (random.chance(5)) {
+    for (const char* name : {"nx", "ny", "nz"}) {
+      plans.push_back({scalar(name, DataType::float32),
+                       [](Random& r, std::size_t) { return std::vector<double>{randomValue(r, DataType::float32)}; }});
+    }
+  }
   if (random.chance(30)) {
     // Filled once the corners are known: two values per corner, or now and then any number.
     const DataType type = random.chance(80) ? DataType::float32 : anyType(random);
@@ -253,6 +283,27 @@ ModelElement stripElement(Random& random, std::size_t vertices) {
   return elementOf("tristrips", static_cast<std::size_t>(random.between(1, 5)), std::move(plans), random);
 }
 
+// Materials of any kind of values, a few of them equal.
+ModelElement materialElement(Random& random) {
+  std::vector<PropertyPlan> plans;
+  for (const char* group : {"ambient_", "diffuse_", "specular_"}) {
+    if (random.chance(50)) addColours(random, plans, group);
+  }
+  for (const char* name : {"specular_power", "opacity"}) {
+    if (!random.chance(40)) continue;
+    const DataType type = random.chance(70) ? DataType::float32 : anyType(random);
+    plans.push_back({scalar(name, type), [type](Random& r, std::size_t) {
+                       return std::vector<double>{r.chance(30) ? 1.0 : randomChannel(r, type)};
+                     }});
+  }
+  ModelElement element =
+      elementOf("material", static_cast<std::size_t>(random.between(0, 6)), std::move(plans), random);
+  for (std::size_t i = 1; i < element.values.size(); ++i) {
+    if (random.chance(30)) element.values[i] = element.values[i - 1];
+  }
+  return element;
+}
+
 ModelElement edgeElement(Random& random, std::size_t vertices) {
   std::vector<PropertyPlan> plans;
   plans.push_back(
@@ -298,19 +349,25 @@ PlyModel randomModel(Random& random) {
   const std::size_t vertices = static_cast<std::size_t>(random.chance(2)    ? random.between(2000, 6000)
                                                         : random.chance(10) ? random.between(128, 300)
                                                                             : random.between(3, 60));
-  enum class Kind { vertex, face, strips, edge, unknown };
+  enum class Kind { vertex, face, strips, edge, material, unknown };
   std::vector<Kind> kinds = {Kind::vertex, Kind::face};
   if (random.chance(15)) kinds.push_back(Kind::vertex);
   if (random.chance(25)) kinds.push_back(Kind::face);
-  if (random.chance(30)) kinds.push_back(Kind::strips);
-  if (random.chance(25)) kinds.push_back(Kind::edge);
+  for (const Kind kind : {Kind::strips, Kind::strips, Kind::edge, Kind::edge}) {
+    if (random.chance(kinds.back() == kind ? 10 : 30)) kinds.push_back(kind);
+  }
+  if (random.chance(15)) kinds.push_back(Kind::material);
   for (std::int64_t k = random.between(0, 2); k > 0; --k) kinds.push_back(Kind::unknown);
   random.shuffle(kinds.begin(), kinds.end());
   PlyModel model;
+  bool firstVertices = true;
   for (const Kind kind : kinds) {
     switch (kind) {
       case Kind::vertex:
-        model.elements.push_back(vertexElement(random, vertices));
+        model.elements.push_back(vertexElement(random, vertices, std::exchange(firstVertices, false)));
+        break;
+      case Kind::material:
+        model.elements.push_back(materialElement(random));
         break;
       case Kind::face:
         model.elements.push_back(faceElement(random, vertices));
@@ -357,6 +414,7 @@ bool breakAnIndex(Random& random, GeneratedFile& file) {
   const auto [e, p] = random.pick(candidates);
   ModelElement& element = file.model.elements[e];
   std::vector<double>& corners = element.values[random.below(element.values.size())][p];
+  if (corners.empty()) return false;
   const double high = std::min(highestOf(element.properties[p].type), vertices + 1000);
   corners[random.below(corners.size())] =
       static_cast<double>(random.between(static_cast<std::int64_t>(vertices), static_cast<std::int64_t>(high)));
