@@ -31,12 +31,11 @@ using scene::mesh_schema;
 using scene::meshColorSet_schema;
 using scene::meshPrimitive_schema;
 using scene::meshUVSet_schema;
-using testing_support::ImportedScene;
 using testing_support::encodings;
 using testing_support::exportScene;
 using testing_support::formatEntries;
+using testing_support::ImportedScene;
 using testing_support::importFile;
-
 
 // A fresh folder for the files one test writes.
 class ExportFolder {
@@ -496,6 +495,17 @@ TEST(PlyExport, KeptPropertiesGoBackToTheElementTheyCameFrom) {
   single.mesh().removeMember(base::intern("keptProperties"));
   ASSERT_TRUE(exportScene(single, old));
   EXPECT_EQ(writtenLayout(old)[0].second, (std::vector<std::string>{"x", "y", "z", "quality"}));
+}
+
+TEST(PlyExport, AFaceWithoutCornersHasNoColourToTakeFromAnother) {
+  // Its colour has no corner to hang on in the scene: it is written as 0, never as the
+  // colour of the face after it (or of whatever lies past the last one).
+  const ImportedScene imported =
+      importFile(MESHPORT_TEST_DATA "/ply/regressions/valid-ascii-faces-without-corners-with-colours.ply");
+  const ExportFolder folder;
+  ASSERT_TRUE(exportScene(imported, folder.file("out.ply"), formatEntries("ascii")));
+  const std::string text = readText(folder.file("out.ply"));
+  EXPECT_NE(text.find("\n0 0 0 0\n3 0 1 2 40 50 60\n0 0 0 0\n"), std::string::npos) << text;
 }
 
 }  // namespace
