@@ -91,9 +91,13 @@ WriteElement materialElement(const std::vector<const base::IPlugin*>& materials,
   }
   WriteElement element{"material", materials.size(), {}};
   // The import makes materials only from diffuse, ambient or specular colours: one of them
-  // is always written, so that no material is lost.
-  if (hasColour || !hasReflection) addColumn(element, "diffuse", diffuse, 3, storage);
+  // is always written, so that no material is lost. Ambient colours reach no material, so
+  // materials without colour and reflection come back without them.
+  if (hasColour) addColumn(element, "diffuse", diffuse, 3, storage);
   if (hasReflection) addColumn(element, "specular", specular, 3, storage);
+  if (!hasColour && !hasReflection) {
+    addColumn(element, "ambient", std::vector<float>(diffuse.size(), 0.0f), 3, storage);
+  }
   if (hasRoughness) addColumn(element, "specular_power", power, 1, storage);
   if (hasVisibility) addColumn(element, "opacity", opacity, 1, storage);
   return element;

@@ -492,15 +492,19 @@ void MeshLayout::addUnnamedKeptList(std::string_view member, WriteProperty prope
 }
 
 void MeshLayout::addMaterials() {
+  // The first primitive that names materials keeps its list as it is, an instance per entry,
+  // so that entries sharing a material still count as many; later ones add what it lacks.
   std::vector<const base::IPlugin*> materials;
+  bool first = true;
   for (const base::AttribMap* primitive : setsOf(m_mesh, mesh_schema::primitives())) {
     const auto* named = primitive->findVecAttribute<base::ref<base::IPlugin>>(meshPrimitive_schema::materials());
     for (const base::ref<base::IPlugin>& material : named ? *named : base::vector<base::ref<base::IPlugin>>{}) {
       if (material && material->mapType() == scene::principalMaterial_schema::typeName() &&
-          std::find(materials.begin(), materials.end(), material.get()) == materials.end()) {
+          (first || std::find(materials.begin(), materials.end(), material.get()) == materials.end())) {
         materials.push_back(material.get());
       }
     }
+    first = first && materials.empty();
   }
   if (!materials.empty()) m_elements.push_back(materialElement(materials, m_kept));
 }
