@@ -28,30 +28,8 @@ std::string fileBytes(const std::string& path) {
   return bytes.str();
 }
 
-// Every valid test file and two of other tools (a scanner's big-endian cloud with
-// texture_u/v, a mesh with per-face texcoord lists). Read from a stream without a size, the
-// lists grow with the data, and the scene must be the same.
-std::vector<std::string> plainFiles() {
-  std::vector<std::string> paths = {MESHPORT_CORPUS "/files/here__halfcone_big_endian.ply",
-                                    MESHPORT_CORPUS "/files/loadersgl__cube_att.ply"};
-  for (const auto& entry : std::filesystem::directory_iterator(MESHPORT_TEST_DATA "/ply/valid")) {
-    if (entry.path().extension() == ".ply") paths.push_back(entry.path().string());
-  }
-  return paths;
-}
-
-TEST(GzipImport, AGzippedFileImportsAsTheFileItHolds) {
-  testing_support::LogCapture quiet;
-  for (const std::string& plain : plainFiles()) {
-    const std::string name = std::filesystem::path(plain).filename().string();
-    const TemporaryFile compressed(name + ".gz", gzipped(fileBytes(plain)));
-    for (const bool plans : {true, false}) {
-      const ImportedScene expected = importFile(plain, plans);
-      const ImportedScene imported = importFile(compressed.path(), plans);
-      ASSERT_TRUE(imported.loaded) << name;
-      EXPECT_EQ(imported.json(), expected.json()) << name;
-    }
-  }
+// Every test and corpus file imports gzipped as it does plain (ply_random_files_test.cpp).
+TEST(GzipImport, TheImporterTakesGzippedFiles) {
   EXPECT_NE(testing_support::pluginFactory().getSupportedExtensions(true).find("ply.gz"), std::string::npos);
 }
 
