@@ -135,12 +135,33 @@ std::uint32_t readCount(Stream& stream, std::uint64_t itemBytes, std::string_vie
   return count;
 }
 
+namespace {
+
+// Whether this thread is counting a member's bytes. The members nested in it then write once:
+// their lengths' values do not change the count, and counting each nested member again at
+// every level would cost twice as much per level of nesting.
+thread_local bool countingMember = false;
+
+}  // namespace
+
 // A member's binary form preceded by its byte length, which a first pass counts: no stream
 // has to go back and no form is buffered (a list's elements are counted as one block).
 void writeSized(Stream& stream, const Attribute& attr, BinaryContext& context) {
+  if (countingMember) {
+    binary::put(stream, std::uint32_t{0});
+    attr.write(stream, context);
+    return;
+  }
   auto* counter = new ByteCounter;
   Stream counting = Stream::adopt(counter);
-  attr.write(counting, context);
+  struct Counting {
+    Counting() { countingMember = true; }
+    ~Counting() { countingMember = false; }
+  };
+  {
+    const Counting guard;
+    attr.write(counting, context);
+  }
   if (counter->total > 0xFFFFFFFFu) {
     raise<exception>("base::AttribMap::write", fmt::format("A member of type '{}' takes {} bytes, more than 4 GiB",
                                                            text(attr.type()), counter->total));

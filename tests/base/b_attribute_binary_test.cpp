@@ -214,6 +214,16 @@ TEST(AttributeBinary, NestingDeeperThan256LevelsIsRefusedNotRecursedInto) {
     // The failed reads left the context's count where it was.
     EXPECT_TRUE(readForm(nestedForm(256, arrays))) << arrays;
   }
+  // What reads writes back, in time: each member's length is counted once, not again at
+  // every level above it (2 to the 256th writes).
+  const base::string form = nestedForm(256, false);
+  base::Stream in = base::memStream(form.data(), static_cast<std::int64_t>(form.size()), "deep");
+  base::AttribMap deep;
+  deep.read(in, base::plainContext());
+  base::vector<std::uint8_t> written;
+  base::Stream out = base::vectorStream(written);
+  deep.write(out, base::plainContext());
+  EXPECT_EQ(std::string(written.begin(), written.end()), std::string(form.begin(), form.end()));
 }
 
 #if defined(MESHPORT_HAS_ADDRESS_LIMIT)
