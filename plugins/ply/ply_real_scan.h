@@ -4,7 +4,6 @@
 
 #include <bit>
 #include <cstdint>
-#include <limits>
 #include <type_traits>
 
 namespace ply::detail {
@@ -16,11 +15,10 @@ namespace ply::detail {
 /// halfway between two floats. Gives the end of the number, or null to leave the word to
 /// an exact reader (from_chars).
 ///
-/// The fraction's digits are counted in a `Count`. A fraction of zeros keeps the mantissa
-/// at 0 however long it is, so its count is bounded by the counter's range, not by the
-/// mantissa: a fraction longer than a `Count` can count is left to the exact reader. Tests
-/// give a narrow `Count` to reach that bound.
-template <class T, class Count = int>
+/// The fraction's digits are counted by their span once the fraction ends, not digit by
+/// digit: a fraction of zeros keeps the mantissa at 0 however long it is, and its length
+/// then fits any pointer difference, where a counter of its own could overflow.
+template <class T>
 const char* scanRealFast(const char* at, const char* const end, T& result) {
   static constexpr double powers[] = {1e0,  1e1,  1e2,  1e3,  1e4,  1e5,  1e6,  1e7,  1e8,  1e9,  1e10, 1e11,
                                       1e12, 1e13, 1e14, 1e15, 1e16, 1e17, 1e18, 1e19, 1e20, 1e21, 1e22};
@@ -28,17 +26,21 @@ const char* scanRealFast(const char* at, const char* const end, T& result) {
   const bool negative = at != end && *at == '-';
   if (at != end && (*at == '-' || *at == '+')) ++at;
   std::uint64_t mantissa = 0;
-  Count fraction = 0;
-  bool digits = false;
-  for (; at != end && *at >= '0' && *at <= '9'; ++at, digits = true) {
+  const char* const first = at;
+  for (; at != end && *at >= '0' && *at <= '9'; ++at) {
     if (mantissa > mantissaLimit) return nullptr;
     mantissa = mantissa * 10 + static_cast<std::uint64_t>(*at - '0');
   }
+  bool digits = at != first;
+  std::ptrdiff_t fraction = 0;
   if (at != end && *at == '.') {
-    for (++at; at != end && *at >= '0' && *at <= '9'; ++at, digits = true, ++fraction) {
-      if (mantissa > mantissaLimit || fraction == std::numeric_limits<Count>::max()) return nullptr;
+    const char* const fractionStart = ++at;
+    for (; at != end && *at >= '0' && *at <= '9'; ++at) {
+      if (mantissa > mantissaLimit) return nullptr;
       mantissa = mantissa * 10 + static_cast<std::uint64_t>(*at - '0');
     }
+    fraction = at - fractionStart;
+    digits = digits || fraction > 0;
   }
   if (!digits) return nullptr;
   int written = 0;  // the exponent as written, at most 9999

@@ -76,24 +76,18 @@ TEST(PlyAsciiNumbers, BoundariesOfTheFastPath) {
 // A fraction of zeros keeps the mantissa at 0, so only the digit counter bounds it. With a
 // counter of 8 bits, 127 digits are the most that are counted; a longer fraction goes to the
 // exact reader rather than wrapping the count (0.<260 zeros>1 read as 1e-5).
-TEST(PlyAsciiNumbers, AFractionLongerThanItsCounterCanCountIsLeftToTheExactReader) {
+TEST(PlyAsciiNumbers, AFractionOfAnyLengthIsCountedWithoutOverflow) {
   const auto scan = [](const std::string& word, double& value) {
-    return ply::detail::scanRealFast<double, std::int8_t>(word.data(), word.data() + word.size(), value);
+    return ply::detail::scanRealFast(word.data(), word.data() + word.size(), value);
   };
+  // The fraction's length and the written exponent together make the power of ten.
   double value = 0;
-  const std::string longest = "0." + std::string(126, '0') + "1e120";
-  EXPECT_EQ(scan(longest, value), longest.data() + longest.size());
+  const std::string shifted = "0." + std::string(126, '0') + "1e120";
+  EXPECT_EQ(scan(shifted, value), shifted.data() + shifted.size());
   EXPECT_EQ(value, 1e-7);
-  for (const std::size_t zeros : {127, 255, 260, 1000}) {
-    const std::string word = "0." + std::string(zeros, '0') + "1";
-    EXPECT_EQ(scan(word, value), nullptr) << zeros;
-  }
-  // The reader's own counter: a fraction of a million digits still reads exactly.
+  // A fraction of a million digits leaves the fast reading and reads exactly.
   const std::string word = "0." + std::string(1 << 20, '0') + "1";
-  const std::string followed = word + " ";
-  double fast = 0;
-  EXPECT_EQ(ply::parseAsciiFast<ply::DataType::float64>(followed.data(), followed.data() + followed.size(), fast),
-            nullptr);
+  EXPECT_EQ(scan(word, value), nullptr);
   expectBothExact(word);
   expectBothExact("-0." + std::string(1 << 20, '0'));
 }
